@@ -1,0 +1,67 @@
+// The regeneration cycle every changing command ends in: load the WebDAV
+// share lists and the catalogue, reconcile them, write the lists back,
+// rebuild the links and /tmp/dav.conf, the note file and the USB sections,
+// place the configuration, release the marks, restart or stop the server.
+//
+// A command runs cycle_begin (marks, lists, loading, enable flag), makes its
+// own change to run->entries, then cycle_finish. The variant states where a
+// command differs from "start". Any failure takes the failure exit: what
+// exists is freed, the marks are released, nothing is written or restarted.
+#ifndef DAVSYNC_CYCLE_REGENERATION_H
+#define DAVSYNC_CYCLE_REGENERATION_H
+
+#include "shares/dav_share_list.h"
+#include "shares/path_list.h"
+#include "shares/share_catalogue.h"
+
+enum ReconcileRule {
+    RECONCILE_PATH,           // an entry takes the name of the first share below its path
+    RECONCILE_NAME_AND_PATH,  // an entry stays only when a share matches name and path
+};
+
+enum AllenValue { ALLEN_ONE, ALLEN_ZERO, ALLEN_ENABLE_FLAG };
+
+enum ListWriter {
+    WRITE_FIXED_DIRECTORIES,  // the four data volume directories and the iso list
+    WRITE_CHOSEN_DIRECTORIES, // only what the command put in run->volume_dirs
+    WRITE_ALL_VOLUMES,        // every mounted volume's list, no iso list
+};
+
+struct CycleVariant {
+    bool wait_start_lock;        // wait for and mark the start lock first
+    bool clear_start_lock;       // remove the start-lock file at the end
+    bool read_enable_flag;       // otherwise WebDAV counts as disabled
+    ReconcileRule rule;
+    AllenValue allen;
+    ListWriter writer;
+    bool prepare_link_dir;       // empty or create the link directory first
+    bool remove_links_after_conf;
+};
+
+struct CycleRun {
+    const CycleVariant *variant;
+    int node_lock;               // -1 while not held
+    DavShareEntry *entries;
+    ShareRecord *catalogue;
+    PathNode *volume_dirs;
+    PathNode *published;
+    int webdav_enable;
+};
+
+// Start lock (if the variant says so), path lists, node lock (unless
+// `node_lock` is a lock the caller already holds, else pass -1), entry list
+// loaded from all volumes, enable flag. 0, or -1 after the failure exit.
+int cycle_begin(CycleRun *run, const CycleVariant *variant, int node_lock);
+// Catalogue, reconciliation, share lists, links, configuration, note file,
+// USB sections, placing, marks released, server restarted or stopped,
+// everything freed. 0, or -1 after the failure exit.
+int cycle_finish(CycleRun *run);
+// The failure exit for a command that gives up between the two halves.
+int cycle_abort(CycleRun *run);
+
+// The WebDAV enable flag: 1 exactly when /system_mgr/webdav/enable is "1".
+int read_webdav_enable_flag();
+// The volume prefix of a path (its first 13 characters) into `out`.
+void volume_prefix(const char *path, char out[PATH_NODE_WIDTH]);
+
+#endif

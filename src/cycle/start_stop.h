@@ -1,0 +1,10 @@
+// The start command (the cycle with no change of its own) and the stop
+// command (the cycle with WebDAV off, the links removed again and the
+// server stopped). 0, or -1 after the failure exit.
+#ifndef DAVSYNC_CYCLE_START_STOP_H
+#define DAVSYNC_CYCLE_START_STOP_H
+
+int webdav_start();
+int webdav_stop();
+
+#endif

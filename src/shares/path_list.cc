@@ -1,0 +1,33 @@
+#include "shares/path_list.h"
+
+#include <cstdlib>
+#include <cstring>
+
+#include "base/text_field.h"
+
+PathNode *new_path_node() {
+    return static_cast<PathNode *>(calloc(1, sizeof(PathNode)));
+}
+
+void free_path_list(PathNode *head) {
+    while (head != nullptr) {
+        PathNode *next = head->next;
+        free(head);
+        head = next;
+    }
+}
+
+int path_list_add(const char *text, PathNode *head) {
+    if (head == nullptr) return 0;
+    if (strlen(text) >= sizeof head->path) return -1;
+    PathNode *tail = head;
+    for (PathNode *node = head; node != nullptr; node = node->next) {
+        if (text[0] != '\0' && strcmp(node->path, text) == 0) return -1;
+        tail = node;
+    }
+    PathNode *added = new_path_node();
+    if (added == nullptr) return -1;
+    copy_text(added->path, text);
+    tail->next = added;
+    return 0;
+}

@@ -1,0 +1,28 @@
+// Small libxml2 helpers shared by the catalogue and share list readers. The
+// first three are also offered, under these C names, to the appliance's
+// libraries loaded with the executable.
+#ifndef DAVSYNC_SHARES_XML_HELPERS_H
+#define DAVSYNC_SHARES_XML_HELPERS_H
+
+#include <cstddef>
+#include <libxml/tree.h>
+
+extern "C" {
+// First child of `parent` whose name equals `name` (any node kind), or null.
+// With a buffer: clears its first `size` bytes and delivers the child's text
+// content in it (cut to size-1 characters).
+xmlNode *search_xml_children(xmlNode *parent, const xmlChar *name, char *buffer, int size);
+// Replaces each "&amp;" by "&" in place, one pass, within a 4096-character
+// work area (longer texts are cut there). Returns text, or null when it held
+// no "&amp;" (text unchanged).
+char *recover_special_char(char *text);
+// xmlFreeDoc, xmlCleanupParser, xmlMemoryDump.
+void free_xml_memory(xmlDoc *doc);
+}
+
+// When node's name equals `name`: copies its text content into `buffer`
+// (cut to `size`-1 characters) and returns buffer; otherwise null, buffer
+// untouched.
+char *copy_node_text_if_named(xmlNode *node, const xmlChar *name, char *buffer, size_t size);
+
+#endif
