@@ -28,6 +28,7 @@ enum ListWriter {
 };
 
 struct CycleVariant {
+    bool lock_taken_first;       // the command holds the node lock before the cycle
     bool wait_start_lock;        // wait for and mark the start lock first
     bool clear_start_lock;       // remove the start-lock file at the end
     bool read_enable_flag;       // otherwise WebDAV counts as disabled
@@ -40,7 +41,8 @@ struct CycleVariant {
 
 struct CycleRun {
     const CycleVariant *variant;
-    int node_lock;               // -1 while not held
+    int node_lock;
+    bool lock_taken;             // node_lock still to be released
     DavShareEntry *entries;
     ShareRecord *catalogue;
     PathNode *volume_dirs;
@@ -48,9 +50,10 @@ struct CycleRun {
     int webdav_enable;
 };
 
-// Start lock (if the variant says so), path lists, node lock (unless
-// `node_lock` is a lock the caller already holds, else pass -1), entry list
-// loaded from all volumes, enable flag. 0, or -1 after the failure exit.
+// Start lock (if the variant says so), path lists, node lock (the caller's
+// `node_lock` when the variant says it took the lock first; else it is
+// ignored), entry list loaded from all volumes, enable flag. 0, or -1 after
+// the failure exit.
 int cycle_begin(CycleRun *run, const CycleVariant *variant, int node_lock);
 // Catalogue, reconciliation, share lists, links, configuration, note file,
 // USB sections, placing, marks released, server restarted or stopped,
