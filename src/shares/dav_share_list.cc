@@ -1,0 +1,307 @@
+#include "shares/dav_share_list.h"
+
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <libxml/parser.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include "base/safe_file.h"
+#include "base/text_field.h"
+#include "platform/volume_lib.h"
+#include "shares/xml_helpers.h"
+
+namespace {
+
+constexpr char VOLUME_LIST[] = "lighty.xml";
+constexpr char ISO_LIST[] = "lighty_iso.xml";
+constexpr char VOLUME_LIST_TMP[] = "/tmp/lighty.xml";
+constexpr char ISO_LIST_TMP[] = "/tmp/lighty_iso.xml";
+constexpr char ISO_DIR[] = "/mnt/isoMount";
+// One more than a field, so that an overlong element text shows as such.
+constexpr size_t ITEM_TEXT_WIDTH = DAV_TEXT_WIDTH + 1;
+constexpr size_t NUMBER_TEXT_WIDTH = 64;
+
+const xmlChar *xml_name(const char *name) { return reinterpret_cast<const xmlChar *>(name); }
+
+int to_int(const char *text) { return static_cast<int>(strtol(text, nullptr, 10)); }
+
+// Reads one item's elements into `entry`; non-empty texts only, a later
+// element of the same name wins. `prefix` goes in front of the path. An item
+// with a text too long for its field is skipped whole: a cut path would name
+// a parent folder.
+void read_item(DavShareEntry *entry, xmlNode *item, const char *prefix) {
+    DavShareEntry read = *entry;
+    for (xmlNode *child = item->children; child != nullptr; child = child->next) {
+        char text[ITEM_TEXT_WIDTH] = {};
+        int fits = 0;
+        if (copy_node_text_if_named(child, xml_name("shared_name"), text, sizeof text)) {
+            if (text[0] != '\0') fits = copy_text(read.shared_name, text);
+        } else if (copy_node_text_if_named(child, xml_name("path"), text, sizeof text)) {
+            if (text[0] != '\0')
+                fits = format_text_field(read.path, sizeof read.path, "%s%s", prefix, text);
+        } else if (copy_node_text_if_named(child, xml_name("enable"), text, sizeof text)) {
+            if (text[0] != '\0') read.enable = to_int(text);
+        } else if (copy_node_text_if_named(child, xml_name("RW"), text, sizeof text)) {
+            if (text[0] != '\0') read.RW = to_int(text);
+        }
+        if (fits != 0) return;
+    }
+    *entry = read;
+}
+
+// Every child of the list element is read as an item; a new entry is
+// started only once the current one has a shared_name. -1 when memory runs out.
+int read_items(DavShareEntry *entry, xmlNode *list, const char *prefix) {
+    DavShareEntry *current = entry;
+    for (xmlNode *node = list->children; node != nullptr; node = node->next) {
+        if (current->shared_name[0] != '\0') {
+            DavShareEntry *added = new_dav_share_entry();
+            if (added == nullptr) return -1;
+            current->next = added;
+            current = added;
+        }
+        read_item(current, node, prefix);
+    }
+    return 0;
+}
+
+// The list element: the root's first child. Null for a file without one.
+xmlNode *list_element(xmlDoc *doc) {
+    xmlNode *root = xmlDocGetRootElement(doc);
+    return root != nullptr ? root->children : nullptr;
+}
+
+xmlDoc *parse_list_file(const char *path) {
+    xmlKeepBlanksDefault(0);
+    return xmlReadFile(path, "UTF-8", XML_PARSE_NODICT);
+}
+
+// A volume list: count, then allen, then the items. A list without children
+// is a list without items.
+int read_counted_list(xmlDoc *doc, DavShareEntry *entry, const char *prefix, int *allen_out) {
+    xmlNode *list = list_element(doc);
+    if (list == nullptr || list->children == nullptr) return 0;
+    char text[NUMBER_TEXT_WIDTH] = {};
+    xmlNode *count_node = list->children;
+    if (!copy_node_text_if_named(count_node, xml_name("count"), text, sizeof text)) return -1;
+    int count = to_int(text);
+    xmlNode *allen_node = count_node->next;
+    if (allen_node == nullptr) {
+        *allen_out = count;
+    } else {
+        if (!copy_node_text_if_named(allen_node, xml_name("allen"), text, sizeof text)) return -1;
+        *allen_out = to_int(text);
+    }
+    // The count says only whether there are items, not how many.
+    if (count == 0 || count == -1) return 0;
+    return read_items(entry, list, prefix);
+}
+
+void append_list(DavShareEntry *head, DavShareEntry *tail) {
+    DavShareEntry *last = head;
+    while (last->next != nullptr) last = last->next;
+    last->next = tail;
+}
+
+// Entries a failed read linked behind `target` go before it is reused.
+void drop_following(DavShareEntry *target) {
+    free_dav_share_list(target->next);
+    target->next = nullptr;
+}
+
+// A scanned volume table, or null when no data volume is mounted.
+VolumeEntry *scan_volume_table() {
+    VolumeEntry *volumes = new_volume_entry();
+    if (volumes != nullptr && scan_data_volumes(volumes) != 0) {
+        free_volume_list(volumes);
+        return nullptr;
+    }
+    return volumes;
+}
+
+// Whether `entry` is written to the list of `directory`; if so its escaped
+// name and its escaped path less the volume prefix. Texts that do not escape
+// within the buffer are left out rather than written cut.
+bool item_texts(const DavShareEntry *entry, const char *directory, char *name_out,
+                char *path_out) {
+    if (strncmp(entry->path, directory, strlen(directory)) != 0) return false;
+    struct stat status;
+    if (stat(entry->path, &status) != 0) return false;
+    char path[XML_ESCAPE_WIDTH] = {};
+    if (escape_xml_text(entry->shared_name, name_out) != 0) return false;
+    if (escape_xml_text(entry->path, path) != 0) return false;
+    size_t length = strlen(path);
+    size_t dropped = length < VOLUME_PREFIX_LENGTH ? length : VOLUME_PREFIX_LENGTH;
+    copy_text_field(path_out, XML_ESCAPE_WIDTH, path + dropped);
+    return true;
+}
+
+void write_list_body(FILE *file, const DavShareEntry *entries, const char *directory, int allen) {
+    char name[XML_ESCAPE_WIDTH];
+    char path[XML_ESCAPE_WIDTH];
+    int count = 0;
+    for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next)
+        if (item_texts(entry, directory, name, path)) ++count;
+    fputs("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n", file);
+    fprintf(file, "\t\t<count>%d</count>\n\t\t<allen>%d</allen>\n", count, allen);
+    for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next) {
+        memset(name, 0, sizeof name);
+        memset(path, 0, sizeof path);
+        if (!item_texts(entry, directory, name, path)) continue;
+        fprintf(file,
+                "\t\t\t<item>\n\t\t\t\t<shared_name>%s</shared_name>\n\t\t\t\t<path>%s</path>\n"
+                "\t\t\t\t<RW>%d</RW>\n\t\t\t\t<enable>%d</enable>\n\t\t\t</item>\n",
+                name, path, entry->RW, entry->enable);
+    }
+    fputs("\t</WebDAV>\n</config>\n", file);
+}
+
+// -1 when the temporary file cannot be opened (a planted link included).
+int write_list_file(const char *tmp_path, const DavShareEntry *entries, const char *directory,
+                    int allen) {
+    FILE *file = fopen_no_follow(tmp_path, "w+");
+    if (file == nullptr) return -1;
+    write_list_body(file, entries, directory, allen);
+    fclose(file);
+    return 0;
+}
+
+void store_list_file(const char *tmp_path, const char *volume_dir) {
+    saveDataToHiddenByVolume(tmp_path, volume_dir);
+    remove(tmp_path);
+}
+
+// The iso list is kept on every volume; the file goes whatever was found.
+void store_iso_list() {
+    VolumeEntry *volumes = scan_volume_table();
+    for (VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next)
+        if (volume->mount_dir[0] != '\0') saveDataToHiddenByVolume(ISO_LIST_TMP, volume->mount_dir);
+    free_volume_list(volumes);
+    remove(ISO_LIST_TMP);
+}
+
+}  // namespace
+
+DavShareEntry *new_dav_share_entry() {
+    return static_cast<DavShareEntry *>(calloc(1, sizeof(DavShareEntry)));
+}
+
+void free_dav_share_list(DavShareEntry *head) {
+    while (head != nullptr) {
+        DavShareEntry *next = head->next;
+        free(head);
+        head = next;
+    }
+}
+
+int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
+                           const char *list_name, int *allen_out) {
+    if (entry == nullptr) return -1;
+    entry->next = nullptr;
+    if (volume == nullptr || list_name == nullptr || allen_out == nullptr) return -1;
+    const char *prefix = strstr(list_name, "lighty_iso") != nullptr ? ISO_DIR : volume->mount_dir;
+    char *location = getDataLocationByVolume(list_name, volume->mount_dir);
+    if (location == nullptr || access(location, R_OK) != 0) {
+        free(location);
+        return -1;
+    }
+    xmlDoc *doc = parse_list_file(location);
+    free(location);
+    if (doc == nullptr) return -1;
+    int result = read_counted_list(doc, entry, prefix, allen_out);
+    free_xml_memory(doc);
+    return result;
+}
+
+int load_dav_share_lists(DavShareEntry *head, int *allen_out) {
+    VolumeEntry *volumes = scan_volume_table();
+    if (volumes == nullptr) return -1;
+
+    int allen = 0;
+    DavShareEntry *target = head;
+    for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
+        if (volume->mount_dir[0] == '\0') continue;
+        if (target == nullptr) target = new_dav_share_entry();
+        int read = read_volume_share_list(target, volume, VOLUME_LIST, &allen);
+        *allen_out = allen;
+        if (read == 0) {
+            if (target != head) append_list(head, target);
+            target = nullptr;
+        } else if (target != nullptr) {
+            drop_following(target);
+        }
+    }
+    if (target != head) free_dav_share_list(target);
+
+    // Only the first readable iso list counts; the head never takes from it.
+    target = nullptr;
+    for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
+        if (volume->mount_dir[0] == '\0') continue;
+        if (target == nullptr) target = new_dav_share_entry();
+        if (read_volume_share_list(target, volume, ISO_LIST, allen_out) == 0) {
+            append_list(head, target);
+            target = nullptr;
+            break;
+        }
+        if (target != nullptr) drop_following(target);
+    }
+    free_dav_share_list(target);
+    free_volume_list(volumes);
+    return 0;
+}
+
+int read_share_list_file(DavShareEntry *head, const char *file_path) {
+    if (head == nullptr) return -1;
+    head->next = nullptr;
+    if (file_path == nullptr || access(file_path, R_OK) != 0) return -1;
+    xmlDoc *doc = parse_list_file(file_path);
+    if (doc == nullptr) return -1;
+    xmlNode *list = list_element(doc);
+    int result = list != nullptr ? read_items(head, list, "") : 0;
+    free_xml_memory(doc);
+    return result;
+}
+
+void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen) {
+    for (const PathNode *node = directories; node != nullptr; node = node->next) {
+        const char *directory = node->path;
+        if (directory[0] == '\0') continue;
+        bool iso = strncmp(directory, ISO_DIR, VOLUME_PREFIX_LENGTH) == 0;
+        if (write_list_file(iso ? ISO_LIST_TMP : VOLUME_LIST_TMP, entries, directory, allen) != 0)
+            continue;
+        if (iso) {
+            store_iso_list();
+        } else if (access(directory, F_OK) == 0) {
+            store_list_file(VOLUME_LIST_TMP, directory);
+        }
+    }
+}
+
+void write_volume_share_lists(const DavShareEntry *entries, int allen) {
+    VolumeEntry *volumes = scan_volume_table();
+    for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
+        if (volume->mount_dir[0] == '\0') continue;
+        if (write_list_file(VOLUME_LIST_TMP, entries, volume->mount_dir, allen) != 0) continue;
+        store_list_file(VOLUME_LIST_TMP, volume->mount_dir);
+    }
+    free_volume_list(volumes);
+}
+
+int escape_xml_text(const char *text, char *out) {
+    if (text == nullptr || out == nullptr) return -1;
+    if (strnlen(text, XML_ESCAPE_INPUT_MAX + 1) > XML_ESCAPE_INPUT_MAX) return -1;
+    char work[XML_ESCAPE_WIDTH] = {};
+    for (const char *at = text; *at != '\0'; ++at) {
+        char single[2] = {*at, '\0'};
+        const char *piece = *at == '&'   ? "&amp;"
+                            : *at == '<' ? "&lt;"
+                            : *at == '>' ? "&gt;"
+                            : *at == '"' ? "&quot;"
+                                         : single;
+        if (append_text(work, piece) != 0) return -1;
+    }
+    copy_text_field(out, XML_ESCAPE_WIDTH, work);
+    return 0;
+}

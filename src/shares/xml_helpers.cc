@@ -1,0 +1,67 @@
+#include "shares/xml_helpers.h"
+
+#include <cstring>
+#include <libxml/parser.h>
+#include <libxml/xmlmemory.h>
+
+#include "base/text_field.h"
+
+namespace {
+
+constexpr size_t RECOVER_WORK_WIDTH = 4096;
+constexpr char AMP_ENTITY[] = "&amp;";
+constexpr size_t AMP_ENTITY_LENGTH = sizeof AMP_ENTITY - 1;
+
+// The node's whole text content into `buffer`, cut to fit.
+void copy_node_content(xmlNode *node, char *buffer, size_t size) {
+    xmlChar *content = xmlNodeGetContent(node);
+    copy_text_field(buffer, size, reinterpret_cast<const char *>(content));
+    xmlFree(content);
+}
+
+}  // namespace
+
+extern "C" xmlNode *search_xml_children(xmlNode *parent, const xmlChar *name, char *buffer,
+                                        int size) {
+    bool with_buffer = buffer != nullptr && size > 0;
+    if (with_buffer) memset(buffer, 0, static_cast<size_t>(size));
+    if (parent == nullptr || name == nullptr) return nullptr;
+    for (xmlNode *child = parent->children; child != nullptr; child = child->next) {
+        // Comments and text nodes have names too, and take part on purpose.
+        if (child->name == nullptr || xmlStrcmp(child->name, name) != 0) continue;
+        if (with_buffer) copy_node_content(child, buffer, static_cast<size_t>(size));
+        return child;
+    }
+    return nullptr;
+}
+
+extern "C" char *recover_special_char(char *text) {
+    if (text == nullptr || strstr(text, AMP_ENTITY) == nullptr) return nullptr;
+    char work[RECOVER_WORK_WIDTH] = {};
+    size_t used = 0;
+    const char *rest = text;
+    while (*rest != '\0' && used < sizeof work - 1) {
+        // Each run ends with the '&' that starts the entity, so the entity's
+        // first character is the replacement itself.
+        const char *hit = strstr(rest, AMP_ENTITY);
+        size_t run = hit != nullptr ? static_cast<size_t>(hit - rest) + 1 : strlen(rest);
+        copy_text_prefix(work + used, sizeof work - used, rest, run);
+        used = strlen(work);
+        rest = hit != nullptr ? hit + AMP_ENTITY_LENGTH : rest + run;
+    }
+    // The result is never longer than the text, so it fits where the text was.
+    copy_text_field(text, strlen(text) + 1, work);
+    return text;
+}
+
+extern "C" void free_xml_memory(xmlDoc *doc) {
+    xmlFreeDoc(doc);
+    xmlCleanupParser();
+    xmlMemoryDump();
+}
+
+char *copy_node_text_if_named(xmlNode *node, const xmlChar *name, char *buffer, size_t size) {
+    if (node == nullptr || xmlStrcmp(node->name, name) != 0) return nullptr;
+    copy_node_content(node, buffer, size);
+    return buffer;
+}
