@@ -18,6 +18,20 @@ int copy_text_prefix(char *field, size_t width, const char *text, size_t count) 
     return result;
 }
 
+int store_text_field(char *field, size_t width, const char *text) {
+    if (field == nullptr || width == 0) return -1;
+    if (text == nullptr) text = "";
+    size_t length = strnlen(text, width);
+    int result = 0;
+    if (length > width - 1) {
+        length = width - 1;
+        result = -1;
+    }
+    memcpy(field, text, length);
+    field[length] = '\0';
+    return result;
+}
+
 int copy_text_field(char *field, size_t width, const char *text) {
     return copy_text_prefix(field, width, text, width);
 }

@@ -13,6 +13,9 @@ int copy_text_prefix(char *field, size_t width, const char *text, size_t count);
 // Appends `text` behind the text already in the field; on -1 the field is
 // left exactly as it was (nothing partial is appended).
 int append_text_field(char *field, size_t width, const char *text);
+// For a field known to be zero-filled already: writes the text and its
+// terminator only, so the untouched rest of a large field is never paged in.
+int store_text_field(char *field, size_t width, const char *text);
 int format_text_field(char *field, size_t width, const char *format, ...)
     __attribute__((format(printf, 3, 4)));
 

@@ -58,12 +58,23 @@ void store_field(ShareRecord *record, const CatalogueField &field, char *scratch
     }
     // Replaced before the cut, so a shortened value loses as little as possible.
     if (field.kind == FieldKind::recovered_text) recover_special_char(scratch);
-    copy_text_field(target, field.width, scratch);
+    store_text_field(target, field.width, scratch);
+}
+
+// Records are large and mostly empty: only the bytes that hold a value are
+// ever written, so clearing them clears the whole record without paging in
+// the rest. Keeps next.
+void clear_record_values(ShareRecord *record) {
+    for (const CatalogueField &field : catalogue_fields) {
+        char *target = reinterpret_cast<char *>(record) + field.offset;
+        size_t used = field.kind == FieldKind::number ? field.width
+                                                      : strnlen(target, field.width);
+        explicit_bzero(target, used);
+    }
 }
 
 void read_item(ShareRecord *record, xmlNode *item, char *scratch) {
-    // The record is always the tail, so clearing it whole loses no link.
-    memset(record, 0, sizeof *record);
+    clear_record_values(record);
     for (const CatalogueField &field : catalogue_fields) {
         search_xml_children(item, xml_name(field.element), scratch, ACCESS_LIST_WIDTH);
         store_field(record, field, scratch);
@@ -127,7 +138,8 @@ int read_share_catalogue_file(ShareRecord *head, const char *file_path) {
 void free_share_catalogue(ShareRecord *head) {
     while (head != nullptr) {
         ShareRecord *next = head->next;
-        explicit_bzero(head, sizeof *head);
+        clear_record_values(head);
+        head->next = nullptr;
         free(head);
         head = next;
     }
