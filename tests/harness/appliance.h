@@ -11,6 +11,7 @@
 
 #include <map>
 #include <string>
+#include <utility>
 #include <sys/types.h>
 #include <vector>
 
@@ -94,8 +95,12 @@ public:
 
 private:
     void write_config() const;
+    pid_t launch(const std::string &host_binary, const std::string &inside,
+                 const std::vector<std::string> &args) const;
     std::string root_;
     std::map<std::string, std::string> config_;
+    std::vector<std::string> read_only_;  // host dirs bound read-only at the same place
+    mutable std::map<pid_t, std::pair<int, int>> running_;  // stdout, stderr of started runs
 };
 
 }  // namespace appliance
