@@ -42,7 +42,7 @@ TEST_F(StartCommand, RegeneratesListsConfigurationLinksAndNoteAndRestarts) {
     box.write_share_list(A2, {{"Old name", "/Public", 1, 1}, {"Music", "/Music", 0, 1},
                               {"Gone", "/Gone", 1, 1}});
     box.make_dir("/mnt/HD/HD_a2/Gone");
-    box.make_dir(std::string(LINKS) + "/stale");
+    box.write_file(std::string(LINKS) + "/stale", "");
 
     EXPECT_THAT(run_ok({"start"}), ElementsAre("restart dav"));
 
@@ -190,7 +190,7 @@ TEST_F(GetCommand, AnswersWhetherAFolderIsPublished) {
         {"/mnt/HD/HD_a2/Public/", "-"},
         {"/mnt/HD/HD_a2/Pub", "-"},
         {"/mnt/HD/HD_a2", query_xml("Whole", "/mnt/HD/HD_a2/", 1)},
-        {"/mnt/HD/HD_a2/Music", query_xml("a&amp;b &quot;q&quot;", "/mnt/HD/HD_a2/Music", 0)},
+        {"/mnt/HD/HD_a2/Music", query_xml("a&amp;b &quot;q&quot;", "/mnt/HD/HD_a2/Music", 1)},
         {"/mnt/HD/HD_b2/Backup", query_xml("Backup", "/mnt/HD/HD_b2/Backup", 0)},
         {"/mnt/isoMount/Disc", query_xml("Disc", "/mnt/isoMount/Disc", 1)},
         {"/mnt/USB/DISK5", query_xml("DISK5", "/mnt/USB/DISK5", 1)},
