@@ -5,7 +5,8 @@
 constexpr int SHELL_ESCAPE_INPUT_MAX = 512;
 
 // Puts a backslash before each of: space # $ % & ' ( ) + ; < = > [ ] ^ ` { }.
-// `out` is zero-filled by the caller and holds at least twice the text.
+// `out` is zero-filled by the caller and holds at least twice the text and
+// a terminator.
 // A text over 512 characters prints the one message and gives -1.
 int escape_for_shell(const char *text, char *out);
 // True when an escaped text holds nothing the shell would still interpret:
