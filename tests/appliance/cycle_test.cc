@@ -152,7 +152,9 @@ TEST_F(StartCommand, PlantedLockFileLinkIsNotFollowed) {
     box.make_symlink("/etc/important", "/tmp/corvane.node");
     box.make_symlink("/etc/important", "/tmp/lighty.xml");
     box.make_symlink("/etc/important", "/tmp/set_webdav_note");
+    box.make_symlink("/etc/important", "/tmp/webdav_query.xml");
     run_ok({"start"});
+    run_ok({"get", "/mnt/HD/HD_a2/Public"});
     EXPECT_EQ(box.read_file("/etc/important"), "keep");
 }
 
