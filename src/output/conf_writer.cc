@@ -32,6 +32,11 @@ bool path_exists(const char *path) {
     return lstat(path, &status) == 0;
 }
 
+bool is_link_name(const char *shared_name) {
+    return shared_name[0] != '\0' && strchr(shared_name, '/') == nullptr &&
+           strcmp(shared_name, ".") != 0 && strcmp(shared_name, "..") != 0;
+}
+
 bool is_conf_safe_name(const char *shared_name) {
     for (const char *c = shared_name; *c != '\0'; ++c) {
         unsigned char byte = static_cast<unsigned char>(*c);

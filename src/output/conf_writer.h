@@ -24,6 +24,9 @@ bool path_exists(const char *path);
 bool is_conf_safe_name(const char *shared_name);
 // Rows Alias to the blank line after </Directory>. `rules` null gives the
 // open access block; otherwise the block follows the share's lists.
+// A link name must name an entry directly in the link directory: a '/' or a
+// name of "." or ".." would let a share name place a link elsewhere as root.
+bool is_link_name(const char *shared_name);
 void write_share_section(FILE *conf, const char *shared_name, bool dav_on,
                          const ShareRecord *rules);
 void write_note_line(FILE *note, const char *shared_name);

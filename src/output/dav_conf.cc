@@ -47,6 +47,7 @@ static const ShareRecord *find_share(const DavShareEntry *entry, const ShareReco
 // The escaped texts still go to the shell: any character the escaping
 // leaves live keeps the link from being made at all.
 static void make_link(const DavShareEntry *entry) {
+    if (!is_link_name(entry->shared_name)) return;
     char link_path[LINK_PATH_WIDTH];
     if (format_text_field(link_path, sizeof link_path, "%s/%s", DAV_LINK_DIR,
                           entry->shared_name) < 0)

@@ -105,6 +105,7 @@ static void find_shared_name(const char *volume, char (&name)[SHARED_NAME_WIDTH]
 // Unescaped on the command line, so both texts must be ones the shell takes
 // literally.
 static void make_usb_link(const char *volume, const char *shared_name) {
+    if (!is_link_name(shared_name)) return;
     if (!is_shell_literal(volume) || !is_shell_literal(shared_name)) return;
     char command[FILE_LINE_WIDTH];
     if (format_text_field(command, sizeof command, "ln -s %s /usr/local/apache2_dav/webdav/%s",

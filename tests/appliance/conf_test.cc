@@ -169,6 +169,7 @@ TEST_F(ConfFile, CommandLinesCarryNoDataTheShellWouldRun) {
         {"x|/tmp/payload.sh", "/mnt/HD/HD_a2/x3", "", "", "", "yes", ""},
         {"Q", "/mnt/HD/HD_a2/q|/tmp/payload.sh", "", "", "", "yes", ""},
         {neutralised, "/mnt/HD/HD_a2/x4", "", "", "", "yes", ""},
+        {"../../../etc/evil", "/mnt/HD/HD_a2/x5", "", "", "", "yes", ""},
     });
     box.mount("/mnt/USB/USB1", "/dev/sdc1", "vfat");
     box.write_file("/mnt/USB/USB1/.davconf", "ON");
@@ -178,7 +179,7 @@ TEST_F(ConfFile, CommandLinesCarryNoDataTheShellWouldRun) {
                    "x;touch${IFS}/pwned5 = USB1\nevil2 = USB2;touch${IFS}pwned6\n");
 
     std::string conf = start();
-    for (const char *planted : {"/pwned", "/pwned-by-script", "/pwned5"})
+    for (const char *planted : {"/pwned", "/pwned-by-script", "/pwned5", "/etc/evil"})
         EXPECT_FALSE(box.exists(planted)) << planted;
     EXPECT_FALSE(any_file_named({"pwned6", "pwned7", "pwned8"}));
     // Names the configuration can carry keep their sections; only the links go.
