@@ -169,7 +169,7 @@ TEST_F(ConfFile, CommandLinesCarryNoDataTheShellWouldRun) {
         {"x|/tmp/payload.sh", "/mnt/HD/HD_a2/x3", "", "", "", "yes", ""},
         {"Q", "/mnt/HD/HD_a2/q|/tmp/payload.sh", "", "", "", "yes", ""},
         {neutralised, "/mnt/HD/HD_a2/x4", "", "", "", "yes", ""},
-        {"../../../etc/evil", "/mnt/HD/HD_a2/x5", "", "", "", "yes", ""},
+        {"../../../../etc/evil", "/mnt/HD/HD_a2/x5", "", "", "", "yes", ""},
     });
     box.mount("/mnt/USB/USB1", "/dev/sdc1", "vfat");
     box.write_file("/mnt/USB/USB1/.davconf", "ON");
