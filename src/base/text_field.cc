@@ -4,32 +4,34 @@
 #include <cstdio>
 #include <cstring>
 
-int copy_text_prefix(char *field, size_t width, const char *text, size_t count) {
-    if (field == nullptr || width == 0) return -1;
+// Writes at most `count` characters of text and a terminator; the length
+// written, with *cut set when the text had to be shortened.
+static size_t write_terminated(char *field, size_t width, const char *text, size_t count, int *cut) {
     if (text == nullptr) text = "";
     size_t length = strnlen(text, count);
-    int result = 0;
+    *cut = 0;
     if (length > width - 1) {
         length = width - 1;
-        result = -1;
+        *cut = -1;
     }
     memmove(field, text, length);
+    field[length] = '\0';
+    return length;
+}
+
+int copy_text_prefix(char *field, size_t width, const char *text, size_t count) {
+    if (field == nullptr || width == 0) return -1;
+    int cut;
+    size_t length = write_terminated(field, width, text, count, &cut);
     memset(field + length, 0, width - length);
-    return result;
+    return cut;
 }
 
 int store_text_field(char *field, size_t width, const char *text) {
     if (field == nullptr || width == 0) return -1;
-    if (text == nullptr) text = "";
-    size_t length = strnlen(text, width);
-    int result = 0;
-    if (length > width - 1) {
-        length = width - 1;
-        result = -1;
-    }
-    memcpy(field, text, length);
-    field[length] = '\0';
-    return result;
+    int cut;
+    write_terminated(field, width, text, width, &cut);
+    return cut;
 }
 
 int copy_text_field(char *field, size_t width, const char *text) {

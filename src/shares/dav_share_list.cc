@@ -74,6 +74,7 @@ xmlNode *list_element(xmlDoc *doc) {
 }
 
 xmlDoc *parse_list_file(const char *path) {
+    quiet_xml_errors();
     xmlKeepBlanksDefault(0);
     return xmlReadFile(path, "UTF-8", XML_PARSE_NODICT);
 }

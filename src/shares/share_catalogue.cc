@@ -116,6 +116,7 @@ int read_catalogue(ShareRecord *head, const char *file_path) {
     if (head == nullptr || file_path == nullptr) return -1;
     if (strnlen(file_path, CATALOGUE_PATH_WIDTH) >= CATALOGUE_PATH_WIDTH) return -1;
     if (access(file_path, F_OK) != 0) return -1;
+    quiet_xml_errors();
     xmlDoc *doc = xmlReadFile(file_path, nullptr, XML_PARSE_NOBLANKS | XML_PARSE_NODICT);
     if (doc == nullptr) return -1;
     int result = read_items(doc, head);

@@ -65,3 +65,10 @@ char *copy_node_text_if_named(xmlNode *node, const xmlChar *name, char *buffer, 
     copy_node_content(node, buffer, size);
     return buffer;
 }
+
+static void ignore_xml_error(void *, const char *, ...) {}
+
+void quiet_xml_errors() {
+    xmlSetGenericErrorFunc(nullptr, ignore_xml_error);
+    xmlSetStructuredErrorFunc(nullptr, nullptr);
+}

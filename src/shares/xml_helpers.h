@@ -20,6 +20,10 @@ char *recover_special_char(char *text);
 void free_xml_memory(xmlDoc *doc);
 }
 
+// Keeps libxml2 from printing parse errors: the tool prints nothing but its
+// usage text, and a reader's result already tells a broken file.
+void quiet_xml_errors();
+
 // When node's name equals `name`: copies its text content into `buffer`
 // (cut to `size`-1 characters) and returns buffer; otherwise null, buffer
 // untouched.
