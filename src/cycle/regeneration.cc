@@ -70,29 +70,12 @@ int cycle_begin(CycleRun *run, const CycleVariant *variant, int node_lock) {
     return 0;
 }
 
-static bool starts_with(const char *text, const char *prefix, size_t prefix_length) {
-    return strncmp(text, prefix, prefix_length) == 0;
-}
-
-// The first share whose path begins with the entry's path and, under the
-// name-and-path rule, whose name begins the entry's shared name.
-static const ShareRecord *matching_share(const DavShareEntry *entry, const ShareRecord *catalogue,
-                                         ReconcileRule rule) {
-    size_t path_length = strlen(entry->path);
-    for (const ShareRecord *share = catalogue; share != nullptr; share = share->next) {
-        if (!starts_with(share->path, entry->path, path_length)) continue;
-        if (rule == RECONCILE_PATH ||
-            starts_with(entry->shared_name, share->name, strlen(share->name)))
-            return share;
-    }
-    return nullptr;
-}
-
 static void reconcile_entries(DavShareEntry *entries, const ShareRecord *catalogue,
                               ReconcileRule rule) {
     for (DavShareEntry *entry = entries; entry != nullptr; entry = entry->next) {
         if (entry->path[0] == '\0') continue;
-        const ShareRecord *share = matching_share(entry, catalogue, rule);
+        const ShareRecord *share =
+            find_entry_share(entry, catalogue, rule == RECONCILE_NAME_AND_PATH);
         if (share == nullptr) {
             memset(entry->shared_name, 0, sizeof entry->shared_name);
             memset(entry->path, 0, sizeof entry->path);

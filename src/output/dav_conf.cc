@@ -33,17 +33,6 @@ static void prepare_link_dir() {
         run_shell_command("mkdir -p /usr/local/apache2_dav/webdav");
 }
 
-static bool starts_with(const char *text, const char *prefix) {
-    return strncmp(text, prefix, strlen(prefix)) == 0;
-}
-
-static const ShareRecord *find_share(const DavShareEntry *entry, const ShareRecord *catalogue) {
-    for (const ShareRecord *share = catalogue; share != nullptr; share = share->next)
-        if (starts_with(entry->shared_name, share->name) && starts_with(share->path, entry->path))
-            return share;
-    return nullptr;
-}
-
 // The escaped texts still go to the shell: any character the escaping
 // leaves live keeps the link from being made at all.
 static void make_link(const DavShareEntry *entry) {
@@ -71,7 +60,7 @@ static void write_entry(FILE *conf, int webdav_enable, const DavShareEntry *entr
     if (entry->path[0] == '\0' || !is_conf_safe_name(entry->shared_name)) return;
     // Registered even when no share matches, so USB volumes cannot take it.
     if (path_list_add(entry->shared_name, published) < 0) return;
-    const ShareRecord *share = find_share(entry, catalogue);
+    const ShareRecord *share = find_entry_share(entry, catalogue, true);
     if (share == nullptr) return;
     write_share_section(conf, entry->shared_name, webdav_enable != 0 && entry->enable != 0, share);
     if ((webdav_enable & entry->enable) != 0) make_link(entry);

@@ -306,3 +306,14 @@ int escape_xml_text(const char *text, char *out) {
     copy_text_field(out, XML_ESCAPE_WIDTH, work);
     return 0;
 }
+
+const ShareRecord *find_entry_share(const DavShareEntry *entry, const ShareRecord *catalogue,
+                                    bool match_name) {
+    size_t path_length = strlen(entry->path);
+    for (const ShareRecord *share = catalogue; share != nullptr; share = share->next) {
+        if (strncmp(share->path, entry->path, path_length) != 0) continue;
+        if (!match_name || strncmp(entry->shared_name, share->name, strlen(share->name)) == 0)
+            return share;
+    }
+    return nullptr;
+}

@@ -8,6 +8,7 @@
 #define DAVSYNC_SHARES_DAV_SHARE_LIST_H
 
 #include "shares/path_list.h"
+#include "shares/share_catalogue.h"
 #include "shares/volume_table.h"
 
 constexpr int DAV_TEXT_WIDTH = 256;
@@ -43,6 +44,11 @@ int read_share_list_file(DavShareEntry *head, const char *file_path);
 void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen);
 // Writes and stores the volume list of every mounted data volume; no iso list.
 void write_volume_share_lists(const DavShareEntry *entries, int allen);
+// The catalogue share of an entry: the first whose path begins with the
+// entry's path and, with `match_name`, whose name begins the entry's shared
+// name. Null when none is.
+const ShareRecord *find_entry_share(const DavShareEntry *entry, const ShareRecord *catalogue,
+                                    bool match_name);
 // XML-escapes & < > " into `out` (XML_ESCAPE_WIDTH characters). -1 when text
 // is longer than 512 characters or the result would not fit; out unchanged.
 int escape_xml_text(const char *text, char *out);
