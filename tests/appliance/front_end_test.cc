@@ -110,14 +110,6 @@ TEST_F(FrontEnd, DoWithAnUnreadableFileExits255Silently) {
     }
 }
 
-TEST_F(FrontEnd, AFailingCommandStillExits0) {
-    box.remove("/var/www/xml/smb.xml");
-    appliance::RunResult result = box.run({"start"});
-    EXPECT_EQ(result.status, 0) << result.err;
-    EXPECT_EQ(result.out, "");
-    EXPECT_TRUE(box.apache_calls().empty());
-}
-
 // The harness: a program sees the root's files, PATH alone, its output and
 // status come back, and the root disappears with the Appliance while the
 // host's /usr/local stays as it was.

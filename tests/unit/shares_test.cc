@@ -140,32 +140,6 @@ TEST(EscapeXmlText, EscapesFourCharactersWithinItsLimits) {
     }
 }
 
-TEST(XmlHelpers, SearchMatchesAnyNodeKindAndCutsToTheBuffer) {
-    const char xml[] = "<r><!--note--><a>one<b>two</b></a><a>second</a></r>";
-    xmlDoc *doc = xmlReadMemory(xml, sizeof xml - 1, nullptr, nullptr, 0);
-    ASSERT_NE(doc, nullptr);
-    xmlNode *root = xmlDocGetRootElement(doc);
-    char buffer[8];
-    memset(buffer, 'z', sizeof buffer);
-
-    xmlNode *a = search_xml_children(root, BAD_CAST "a", buffer, sizeof buffer);
-    ASSERT_NE(a, nullptr);
-    EXPECT_STREQ(buffer, "onetwo");
-    ASSERT_NE(search_xml_children(root, BAD_CAST "comment", buffer, 5), nullptr);
-    EXPECT_STREQ(buffer, "note");
-    memset(buffer, 'z', sizeof buffer);
-    EXPECT_EQ(search_xml_children(root, BAD_CAST "c", buffer, sizeof buffer), nullptr);
-    EXPECT_EQ(std::string(buffer, sizeof buffer), std::string(sizeof buffer, '\0'));
-    EXPECT_EQ(search_xml_children(root, BAD_CAST "a", nullptr, 0), a);
-
-    char text[4] = "old";
-    EXPECT_EQ(copy_node_text_if_named(a, BAD_CAST "b", text, sizeof text), nullptr);
-    EXPECT_STREQ(text, "old");
-    EXPECT_EQ(copy_node_text_if_named(a, BAD_CAST "a", text, sizeof text), text);
-    EXPECT_STREQ(text, "one");
-    free_xml_memory(doc);
-}
-
 TEST(ShareCatalogue, FailuresLeaveTheHeadUnchanged) {
     struct Case {
         const char *xml;
