@@ -15,6 +15,7 @@ static const size_t NAME_MAX_CHARS = 203;
 static const size_t PATH_MAX_CHARS = 1427;
 
 int LIB_Check_ps(const char *name) {
+    if (name == nullptr) return 0;
     DIR *proc = opendir("/proc");
     if (proc == nullptr) return 0;
     int found = 0;
@@ -45,10 +46,14 @@ static xmlNode *child_named(xmlNode *parent, const char *name) {
     return nullptr;
 }
 
-static void copy_child_text(xmlNode *item, const char *name, char *field, size_t max_chars) {
+// The text of the item's first child element of this name; null when absent.
+static xmlChar *child_text(xmlNode *item, const char *name) {
     xmlNode *child = child_named(item, name);
-    if (child == nullptr) return;
-    xmlChar *text = xmlNodeGetContent(child);
+    return child != nullptr ? xmlNodeGetContent(child) : nullptr;
+}
+
+static void copy_child_text(xmlNode *item, const char *name, char *field, size_t max_chars) {
+    xmlChar *text = child_text(item, name);
     if (text == nullptr) return;
     size_t length = strnlen(reinterpret_cast<const char *>(text), max_chars);
     memcpy(field, text, length);
@@ -59,21 +64,24 @@ static void copy_child_text(xmlNode *item, const char *name, char *field, size_t
 static char *new_record(xmlNode *item) {
     char *record = static_cast<char *>(calloc(1, APKG_RECORD_SIZE));
     if (record == nullptr) return nullptr;
-    char state_text[32] = {};
-    copy_child_text(item, "state", state_text, sizeof state_text - 1);
-    int32_t state = static_cast<int32_t>(strtol(state_text, nullptr, 10));
+    xmlChar *state_text = child_text(item, "state");
+    int32_t state = 0;
+    if (state_text != nullptr) {
+        state = static_cast<int32_t>(strtol(reinterpret_cast<const char *>(state_text), nullptr, 10));
+        xmlFree(state_text);
+    }
     memcpy(record + APKG_RECORD_STATE, &state, sizeof state);
     copy_child_text(item, "name", record + APKG_RECORD_NAME, NAME_MAX_CHARS);
     copy_child_text(item, "path", record + APKG_RECORD_PATH, PATH_MAX_CHARS);
     return record;
 }
 
-int APKG_ReadAllXml(void) {
+int apkg_read_list_file(const char *file) {
     APKG_FreeAllXml();
     char *header = static_cast<char *>(calloc(1, APKG_HEADER_SIZE));
     if (header == nullptr) return -1;
     p_lib_list = header;
-    xmlDoc *doc = xmlReadFile(PACKAGE_LIST, nullptr, XML_PARSE_NONET | XML_PARSE_NOWARNING | XML_PARSE_NOERROR);
+    xmlDoc *doc = xmlReadFile(file, nullptr, XML_PARSE_NONET | XML_PARSE_NOWARNING | XML_PARSE_NOERROR);
     if (doc == nullptr) return 0;
     int result = 0;
     char *link = header + APKG_HEADER_FIRST;  // where the next record's pointer goes
@@ -92,6 +100,8 @@ int APKG_ReadAllXml(void) {
     xmlFreeDoc(doc);
     return result;
 }
+
+int APKG_ReadAllXml(void) { return apkg_read_list_file(PACKAGE_LIST); }
 
 void APKG_FreeAllXml(void) {
     char *header = static_cast<char *>(p_lib_list);

@@ -17,8 +17,8 @@ static xmlNode *first_child_element(xmlNode *parent, const char *name, size_t le
 }
 
 // The value's text, newly allocated with xmlMalloc, or null when missing.
-static xmlChar *lookup_value(const char *slash_path) {
-    xmlDoc *doc = xmlReadFile(CONFIG_FILE, nullptr, XML_PARSE_NONET | XML_PARSE_NOWARNING | XML_PARSE_NOERROR);
+static xmlChar *lookup_value(const char *file, const char *slash_path) {
+    xmlDoc *doc = xmlReadFile(file, nullptr, XML_PARSE_NONET | XML_PARSE_NOWARNING | XML_PARSE_NOERROR);
     if (doc == nullptr) return nullptr;
     xmlNode *node = xmlDocGetRootElement(doc);
     const char *step = slash_path;
@@ -34,9 +34,9 @@ static xmlChar *lookup_value(const char *slash_path) {
     return value;
 }
 
-int xml_get_str(const char *path, int size, char *buf) {
+int xml_get_str_in(const char *file, const char *path, int size, char *buf) {
     if (path == nullptr || buf == nullptr || size <= 0) return -1;
-    xmlChar *value = lookup_value(path);
+    xmlChar *value = lookup_value(file, path);
     if (value == nullptr) return -1;
     size_t length = strnlen(reinterpret_cast<const char *>(value), static_cast<size_t>(size) - 1);
     memcpy(buf, value, length);
@@ -45,11 +45,17 @@ int xml_get_str(const char *path, int size, char *buf) {
     return 0;
 }
 
-int xml_get_int(const char *path) {
+int xml_get_int_in(const char *file, const char *path) {
     if (path == nullptr) return -1;
-    xmlChar *value = lookup_value(path);
+    xmlChar *value = lookup_value(file, path);
     if (value == nullptr) return -1;
     int result = static_cast<int>(strtol(reinterpret_cast<const char *>(value), nullptr, 10));
     xmlFree(value);
     return result;
 }
+
+int xml_get_str(const char *path, int size, char *buf) {
+    return xml_get_str_in(CONFIG_FILE, path, size, buf);
+}
+
+int xml_get_int(const char *path) { return xml_get_int_in(CONFIG_FILE, path); }

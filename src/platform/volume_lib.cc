@@ -1,22 +1,29 @@
 #include "platform/volume_lib.h"
 
 #include <cerrno>
-#include <climits>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <fcntl.h>
-#include <string>
 #include <sys/stat.h>
 #include <unistd.h>
 
-static std::string hidden_location(const char *volume_dir) {
-    return std::string(volume_dir) + "/.system_data";
+static const char HIDDEN_FOLDER[] = ".system_data";
+
+// Newly allocated "<volume_dir>/.system_data[/<name>][<suffix>]"; null when
+// memory is exhausted. Plain malloc: callers are C code that frees with free().
+static char *hidden_path(const char *volume_dir, const char *name, const char *suffix) {
+    size_t size = strlen(volume_dir) + sizeof HIDDEN_FOLDER + 2 +
+                  (name != nullptr ? strlen(name) : 0) + strlen(suffix);
+    char *path = static_cast<char *>(malloc(size));
+    if (path == nullptr) return nullptr;
+    snprintf(path, size, "%s/%s%s%s%s", volume_dir, HIDDEN_FOLDER, name != nullptr ? "/" : "",
+             name != nullptr ? name : "", suffix);
+    return path;
 }
 
 char *getDataLocationByVolume(const char *name, const char *volume_dir) {
-    std::string location = hidden_location(volume_dir) + "/" + name;
-    return strdup(location.c_str());
+    return hidden_path(volume_dir, name, "");
 }
 
 static bool copy_all(int from, int to) {
@@ -37,25 +44,44 @@ static bool copy_all(int from, int to) {
     }
 }
 
-int saveDataToHiddenByVolume(const char *file, const char *volume_dir) {
-    if (file == nullptr || volume_dir == nullptr) return -1;
-    std::string folder = hidden_location(volume_dir);
-    if (mkdir(folder.c_str(), 0755) != 0 && errno != EEXIST) return -1;
-    const char *slash = strrchr(file, '/');
-    std::string final_name = folder + "/" + (slash != nullptr ? slash + 1 : file);
-    std::string temporary = final_name + ".XXXXXX";
+// The folder exists afterwards; a new one gets 0755 whatever the umask.
+static bool make_hidden_folder(const char *folder) {
+    if (mkdir(folder, 0755) == 0) return chmod(folder, 0755) == 0;
+    return errno == EEXIST;
+}
 
+// Copies `file` to `temporary` (a mkstemp template, filled in) and flushes it.
+static bool write_temporary_copy(const char *file, char *temporary) {
     int from = open(file, O_RDONLY | O_CLOEXEC);
-    if (from == -1) return -1;
-    int to = mkostemp(&temporary[0], O_CLOEXEC);
+    if (from == -1) return false;
+    int to = mkostemp(temporary, O_CLOEXEC);
     if (to == -1) {
         close(from);
-        return -1;
+        return false;
     }
     bool stored = copy_all(from, to) && fchmod(to, 0644) == 0 && fsync(to) == 0;
     close(from);
     stored = close(to) == 0 && stored;
-    if (stored && rename(temporary.c_str(), final_name.c_str()) == 0) return 0;
-    unlink(temporary.c_str());
-    return -1;
+    if (!stored) unlink(temporary);
+    return stored;
+}
+
+int saveDataToHiddenByVolume(const char *file, const char *volume_dir) {
+    if (file == nullptr || volume_dir == nullptr) return -1;
+    const char *slash = strrchr(file, '/');
+    const char *base = slash != nullptr ? slash + 1 : file;
+    if (*base == '\0') return -1;
+    char *folder = hidden_path(volume_dir, nullptr, "");
+    char *final_name = hidden_path(volume_dir, base, "");
+    char *temporary = hidden_path(volume_dir, base, ".XXXXXX");
+    int result = -1;
+    if (folder != nullptr && final_name != nullptr && temporary != nullptr &&
+        make_hidden_folder(folder) && write_temporary_copy(file, temporary)) {
+        if (rename(temporary, final_name) == 0) result = 0;
+        else unlink(temporary);
+    }
+    free(folder);
+    free(final_name);
+    free(temporary);
+    return result;
 }
