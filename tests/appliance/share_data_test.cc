@@ -1,4 +1,5 @@
-// Share list files round-tripped through start: escaping and left-out entries.
+// Share list files round-tripped through start: escaping, left-out entries,
+// a volume root and the iso list.
 #include <gmock/gmock.h>
 
 #include "appliance/realistic_appliance.h"
@@ -39,4 +40,23 @@ TEST_F(ShareData, EntriesWhoseFolderIsMissingAreLeftOutAndNotCounted) {
 
     EXPECT_EQ(box.read_share_list(A2),
               share_list_xml(1, {{"Public", "/Public", 1, 1}, {"Music", "/Music", 0, 1}}));
+}
+
+TEST_F(ShareData, VolumeRootAndAnIsoListReadFromTheSecondVolumeRoundTrip) {
+    // First in the catalogue: the path rule names a root entry after the
+    // first share whose path begins with the volume's.
+    shares.insert(shares.begin(), {"Volume", "/mnt/HD/HD_b2/", "", "", "", "yes", ""});
+    box.set_catalogue(shares);
+    box.write_share_list(B2, {{"Volume", "/", 1, 1}, {"Backup", "/Backup", 1, 0}});
+    box.remove("/mnt/HD/HD_a2/.system_data/lighty_iso.xml");
+    box.write_share_list(B2, {{"Disc", "/Disc", 0, 1}}, 0, "lighty_iso.xml");
+
+    run_ok({"start"});
+
+    EXPECT_EQ(box.read_share_list(B2),
+              share_list_xml(1, {{"Volume", "/", 1, 1}, {"Backup", "/Backup", 1, 0}}));
+    for (const char *volume : {A2, B2})
+        EXPECT_EQ(box.read_share_list(volume, "lighty_iso.xml"),
+                  share_list_xml(1, {{"Disc", "/Disc", 0, 1}}))
+            << volume;
 }

@@ -140,6 +140,42 @@ TEST(EscapeXmlText, EscapesFourCharactersWithinItsLimits) {
     }
 }
 
+// Names are compared whatever the node kind: text and comment nodes match too.
+TEST(XmlHelpers, FindChildrenByNameAndDeliverTheirTextCut) {
+    const char xml[] = "<r><a>one</a><!--note--><b>t<i>x</i>u</b><a>two</a></r>";
+    xmlDoc *doc = xmlReadMemory(xml, sizeof xml - 1, nullptr, nullptr, XML_PARSE_NODICT);
+    ASSERT_NE(doc, nullptr);
+    xmlNode *root = xmlDocGetRootElement(doc);
+    auto name = [](const char *text) { return reinterpret_cast<const xmlChar *>(text); };
+    struct Case {
+        xmlNode *parent;
+        const char *name;
+        int size;
+        const char *text;  // null: no child found
+    } cases[] = {{root, "a", 16, "one"},      {root, "comment", 16, "note"},
+                 {root, "b", 3, "tx"},        {root, "zz", 16, nullptr},
+                 {root->children, "text", 16, "one"}};
+    for (const Case &c : cases) {
+        char buffer[16];
+        memset(buffer, '#', sizeof buffer);
+        xmlNode *found = search_xml_children(c.parent, name(c.name), buffer, c.size);
+        EXPECT_EQ(found != nullptr, c.text != nullptr) << c.name;
+        std::string expected(c.text ? c.text : "");
+        expected.resize(c.size, '\0');  // cleared up to size, nothing written past it
+        expected.resize(sizeof buffer, '#');
+        EXPECT_EQ(std::string(buffer, sizeof buffer), expected) << c.name;
+    }
+    EXPECT_EQ(search_xml_children(root, name("a"), nullptr, 0), root->children);
+
+    xmlNode *b = root->children->next->next;
+    char buffer[8] = "keep";
+    EXPECT_EQ(copy_node_text_if_named(b, name("a"), buffer, sizeof buffer), nullptr);
+    EXPECT_STREQ(buffer, "keep");
+    EXPECT_EQ(copy_node_text_if_named(b, name("b"), buffer, 3), buffer);
+    EXPECT_EQ(std::string(buffer, 4), std::string("tx\0p", 4));
+    free_xml_memory(doc);
+}
+
 TEST(ShareCatalogue, FailuresLeaveTheHeadUnchanged) {
     struct Case {
         const char *xml;
