@@ -16,6 +16,7 @@
 #include <sched.h>
 #include <signal.h>
 #include <sstream>
+#include <stdexcept>
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
@@ -239,6 +240,21 @@ const std::string &namespace_problem() {
     return problem;
 }
 
+// A fresh folder in $TMPDIR (or /tmp), as an absolute path: it is chrooted into.
+std::string make_root_folder() {
+    const char *tmpdir = getenv("TMPDIR");
+    std::string templ = std::string(tmpdir && *tmpdir ? tmpdir : "/tmp") + "/davsync-appliance.XXXXXX";
+    if (!mkdtemp(templ.data())) throw std::runtime_error("appliance harness: mkdtemp " + templ +
+                                                         ": " + strerror(errno));
+    char absolute[PATH_MAX];
+    if (!realpath(templ.c_str(), absolute)) {
+        rmdir(templ.c_str());
+        throw std::runtime_error("appliance harness: realpath " + templ + ": " + strerror(errno));
+    }
+    chmod(absolute, 0755);
+    return absolute;
+}
+
 }  // namespace
 
 std::string share_list_xml(int allen, const std::vector<ListItem> &items) {
@@ -270,18 +286,14 @@ std::string catalogue_xml(const std::vector<Share> &shares) {
     return out + "</samba></config>\n";
 }
 
+// Throws, so that the test ends at once on that one line instead of a
+// failure for every run that follows.
 Appliance::Appliance() {
-    char templ[] = "/tmp/davsync-appliance.XXXXXX";
-    if (!mkdtemp(templ)) {
-        ADD_FAILURE() << "mkdtemp: " << strerror(errno);
-        return;
-    }
-    root_ = templ;
-    chmod(root_.c_str(), 0755);
     if (!namespace_problem().empty())
-        ADD_FAILURE() << "appliance harness: no private mount namespace can be had ("
-                      << namespace_problem() << "); run the tests as root or allow "
-                      << "unprivileged user namespaces";
+        throw std::runtime_error("appliance harness: no private mount namespace can be had (" +
+                                 namespace_problem() + "); run the tests as root or allow "
+                                 "unprivileged user namespaces");
+    root_ = make_root_folder();
 
     write_file("/etc/mtab", "");
     write_file("/etc/passwd", "root:x:0:0:root:/root:/bin/sh\n");
@@ -443,7 +455,6 @@ pid_t Appliance::start(const std::vector<std::string> &args) const {
 
 pid_t Appliance::launch(const std::string &host_binary, const std::string &inside,
                         const std::vector<std::string> &args) const {
-    if (!namespace_problem().empty()) return -1;
     // Everything the child needs is made before the fork.
     std::vector<std::string> words = {inside};
     words.insert(words.end(), args.begin(), args.end());

@@ -50,7 +50,7 @@ std::string catalogue_xml(const std::vector<Share> &shares);
 
 class Appliance {
 public:
-    Appliance();   // skeleton root; fails the test loudly when no namespace can be had
+    Appliance();   // skeleton root; throws (the test fails) when no namespace can be had
     ~Appliance();
     Appliance(const Appliance &) = delete;
     Appliance &operator=(const Appliance &) = delete;
