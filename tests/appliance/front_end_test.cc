@@ -80,55 +80,34 @@ TEST_F(FrontEnd, BadCallsPrintTheUsageAndExit255) {
     }
 }
 
-TEST_F(FrontEnd, GuAndResetAloneDoNothing) {
-    for (const Words &words : {Words{"gu"}, Words{"guest"}, Words{"gu", "a", "b", "c"},
-                               Words{"reset"}}) {
-        appliance::RunResult result = box.run(words);
-        EXPECT_EQ(result.status, 0) << describe(words) << "\n" << result.err;
-        EXPECT_EQ(result.out, "") << describe(words);
-        expect_untouched(words);
-    }
-}
-
-TEST_F(FrontEnd, AnyWordBeginningWithStartRunsStartAndIgnoresTheRest) {
-    for (const Words &words : {Words{"start", "x", "y"}, Words{"starter"}}) {
+// gu and reset alone do nothing; any word beginning with "start" runs start
+// and the rest is ignored; do and merge of an unreadable file exit silently.
+TEST_F(FrontEnd, CallsThatPrintNothing) {
+    struct { Words words; int status; Words calls; } cases[] = {
+        {{"gu"}, 0, {}}, {{"guest"}, 0, {}}, {{"gu", "a", "b", "c"}, 0, {}}, {{"reset"}, 0, {}},
+        {{"do", "/tmp/no_such_list.xml"}, 255, {}}, {{"merge", "/tmp/no_such_list.xml"}, 255, {}},
+        {{"start", "x", "y"}, 0, {"restart dav"}}, {{"starter"}, 0, {"restart dav"}},  // last: they write
+    };
+    for (const auto &c : cases) {
         box.remove("/var/log/apache_calls");
-        appliance::RunResult result = box.run(words);
-        EXPECT_EQ(result.status, 0) << describe(words) << "\n" << result.err;
-        EXPECT_EQ(result.out, "") << describe(words);
-        EXPECT_EQ(box.apache_calls(), Words{"restart dav"}) << describe(words);
+        appliance::RunResult result = box.run(c.words);
+        EXPECT_EQ(result.status, c.status) << describe(c.words) << "\n" << result.err;
+        EXPECT_EQ(result.out + result.err, "") << describe(c.words);
+        if (c.calls.empty()) expect_untouched(c.words);
+        else EXPECT_EQ(box.apache_calls(), c.calls) << describe(c.words);
     }
 }
 
-TEST_F(FrontEnd, DoWithAnUnreadableFileExits255Silently) {
-    for (const char *word : {"do", "merge"}) {
-        appliance::RunResult result = box.run({word, "/tmp/no_such_list.xml"});
-        EXPECT_EQ(result.status, 255) << word;
-        EXPECT_EQ(result.out, "") << word;
-        EXPECT_EQ(result.err, "") << word;
-        expect_untouched({word});
-    }
-}
-
-// The harness: a program sees the root's files, PATH alone, its output and
-// status come back, and the root disappears with the Appliance while the
-// host's /usr/local stays as it was.
+// The harness: a program sees PATH alone, and the root disappears with the
+// Appliance while the host's /usr/local stays as it was.
 TEST(Harness, RunsInsideTheRootAndCleansUp) {
     std::string root;
     {
         appliance::Appliance box;
         root = box.root();
-        box.write_file("/etc/x", "seen\n");
-        appliance::RunResult cat = box.run_program("/bin/sh", {"-c", "cat /etc/x; echo oops >&2; exit 3"});
-        EXPECT_EQ(cat.status, 3);
-        EXPECT_EQ(cat.out, "seen\n");
-        EXPECT_EQ(cat.err, "oops\n");
-
         appliance::RunResult env = box.run_program("/usr/bin/env", {});
         EXPECT_EQ(env.out,
                   "PATH=/opt/recorder:/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin\n");
-
-        EXPECT_EQ(box.run_program("/bin/sh", {"-c", "kill -9 $$"}).status, 137);
 
         appliance::RunResult write =
             box.run_program("/bin/sh", {"-c", "mkdir -p /usr/local/harness_probe && apache restart dav"});
