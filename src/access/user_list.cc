@@ -4,6 +4,7 @@
 #include <cstring>
 #include <grp.h>
 
+#include "base/record_list.h"
 #include "base/text_field.h"
 #include "platform/smb_strtok.h"
 
@@ -11,17 +12,9 @@ static const int LIST_TEXT_WIDTH = 12800;
 static const int GROUP_NAME_WIDTH = 128;
 static const char LIST_DELIMITERS[] = "#,";
 
-NameNode *new_name_node() {
-    return static_cast<NameNode *>(calloc(1, sizeof(NameNode)));
-}
+NameNode *new_name_node() { return new_zeroed_record<NameNode>(); }
 
-void free_name_list(NameNode *head) {
-    while (head != nullptr) {
-        NameNode *next = head->next;
-        free(head);
-        head = next;
-    }
-}
+void free_name_list(NameNode *head) { free_record_list(head); }
 
 static bool fits_name_node(const char *name) {
     return strlen(name) < sizeof(NameNode::name);

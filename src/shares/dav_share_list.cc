@@ -8,6 +8,7 @@
 #include <unistd.h>
 
 #include "base/safe_file.h"
+#include "base/record_list.h"
 #include "base/text_field.h"
 #include "platform/volume_lib.h"
 #include "shares/xml_helpers.h"
@@ -185,17 +186,9 @@ void store_iso_list() {
 
 }  // namespace
 
-DavShareEntry *new_dav_share_entry() {
-    return static_cast<DavShareEntry *>(calloc(1, sizeof(DavShareEntry)));
-}
+DavShareEntry *new_dav_share_entry() { return new_zeroed_record<DavShareEntry>(); }
 
-void free_dav_share_list(DavShareEntry *head) {
-    while (head != nullptr) {
-        DavShareEntry *next = head->next;
-        free(head);
-        head = next;
-    }
-}
+void free_dav_share_list(DavShareEntry *head) { free_record_list(head); }
 
 int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
                            const char *list_name, int *allen_out) {

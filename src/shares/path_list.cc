@@ -3,19 +3,12 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "base/record_list.h"
 #include "base/text_field.h"
 
-PathNode *new_path_node() {
-    return static_cast<PathNode *>(calloc(1, sizeof(PathNode)));
-}
+PathNode *new_path_node() { return new_zeroed_record<PathNode>(); }
 
-void free_path_list(PathNode *head) {
-    while (head != nullptr) {
-        PathNode *next = head->next;
-        free(head);
-        head = next;
-    }
-}
+void free_path_list(PathNode *head) { free_record_list(head); }
 
 int path_list_add(const char *text, PathNode *head) {
     if (head == nullptr) return 0;

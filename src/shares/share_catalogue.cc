@@ -6,6 +6,7 @@
 #include <libxml/parser.h>
 #include <unistd.h>
 
+#include "base/record_list.h"
 #include "base/text_field.h"
 #include "shares/xml_helpers.h"
 
@@ -126,9 +127,7 @@ int read_catalogue(ShareRecord *head, const char *file_path) {
 
 }  // namespace
 
-ShareRecord *new_share_record() {
-    return static_cast<ShareRecord *>(calloc(1, sizeof(ShareRecord)));
-}
+ShareRecord *new_share_record() { return new_zeroed_record<ShareRecord>(); }
 
 int read_share_catalogue(ShareRecord *head) { return read_catalogue(head, SYSTEM_CATALOGUE); }
 

@@ -5,19 +5,12 @@
 #include <cstring>
 #include <mntent.h>
 
+#include "base/record_list.h"
 #include "base/text_field.h"
 
-VolumeEntry *new_volume_entry() {
-    return static_cast<VolumeEntry *>(calloc(1, sizeof(VolumeEntry)));
-}
+VolumeEntry *new_volume_entry() { return new_zeroed_record<VolumeEntry>(); }
 
-void free_volume_list(VolumeEntry *head) {
-    while (head != nullptr) {
-        VolumeEntry *next = head->next;
-        free(head);
-        head = next;
-    }
-}
+void free_volume_list(VolumeEntry *head) { free_record_list(head); }
 
 int scan_data_volumes(VolumeEntry *head) {
     if (head == nullptr) return -1;
