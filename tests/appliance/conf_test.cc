@@ -49,12 +49,7 @@ protected:
         publish(shares, items);
     }
 
-    std::string start() {
-        appliance::RunResult result = box.run({"start"});
-        EXPECT_EQ(result.status, 0) << result.err;
-        EXPECT_EQ(result.out, "");
-        return box.read_file(CONF);
-    }
+    std::string start() { return dav_conf_text::start_and_read_conf(box); }
 };
 
 TEST_F(ConfFile, RealisticCatalogueGivesExactlyTheDesignedConfigurationLinksAndNote) {

@@ -4,13 +4,25 @@
 #ifndef DAVSYNC_TESTS_APPLIANCE_DAV_CONF_TEXT_H
 #define DAVSYNC_TESTS_APPLIANCE_DAV_CONF_TEXT_H
 
+#include <gtest/gtest.h>
+
 #include <string>
+
+#include "harness/appliance.h"
 
 namespace dav_conf_text {
 
 inline const std::string LINKS = "/usr/local/apache2_dav/webdav";
 inline const char *const CONF = "/usr/local/apache2_dav/conf/extra/httpd-dav.conf";
 inline const char *const NOTE = "/tmp/set_webdav_note";
+
+// Runs "start", which must succeed silently, and returns the placed configuration.
+inline std::string start_and_read_conf(const appliance::Appliance &box) {
+    appliance::RunResult result = box.run({"start"});
+    EXPECT_EQ(result.status, 0) << result.err;
+    EXPECT_EQ(result.out, "");
+    return box.read_file(CONF);
+}
 
 inline const std::string HEADER =
     "DavLockDB \"/usr/local/apache2_dav/var/DavLock\"\n"

@@ -36,12 +36,7 @@ protected:
         if (marked) box.write_file("/mnt/USB/" + dir + "/.davconf", "ON");
     }
 
-    std::string start() {
-        appliance::RunResult result = box.run({"start"});
-        EXPECT_EQ(result.status, 0) << result.err;
-        EXPECT_EQ(result.out, "");
-        return box.read_file(CONF);
-    }
+    std::string start() { return dav_conf_text::start_and_read_conf(box); }
 };
 
 TEST_F(UsbShares, OnlyMarkedMountedVolumesGetSectionsLinksAndNoteLines) {
