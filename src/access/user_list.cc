@@ -4,11 +4,11 @@
 #include <cstring>
 #include <grp.h>
 
+#include "base/appliance_paths.h"
 #include "base/record_list.h"
 #include "base/text_field.h"
 #include "platform/smb_strtok.h"
 
-static const int LIST_TEXT_WIDTH = 12800;
 static const int GROUP_NAME_WIDTH = 128;
 static const char LIST_DELIMITERS[] = "#,";
 
@@ -63,7 +63,7 @@ static int fill_open_slot(NameNode **open_slot, const char *name) {
     return 0;
 }
 
-static bool list_holds(const NameNode *head, const char *name) {
+bool name_list_holds(const NameNode *head, const char *name) {
     for (const NameNode *node = head; node != nullptr; node = node->next)
         if (strcmp(node->name, name) == 0) return true;
     return false;
@@ -76,7 +76,7 @@ static int add_group(const char *group_name, NameNode *head, NameNode **open_slo
     int result = 0;
     for (const NameNode *member = members; member != nullptr && result == 0;
          member = member->next) {
-        if (list_holds(head, member->name)) continue;
+        if (name_list_holds(head, member->name)) continue;
         result = fill_open_slot(open_slot, member->name);
     }
     free_name_list(members);
@@ -97,9 +97,9 @@ static bool is_delimiter(char c) { return c == '#' || c == ','; }
 
 // A text cut at the width of the working copy loses its last, partial token
 // too, so that no name is read shortened.
-static void copy_whole_tokens(char (&work)[LIST_TEXT_WIDTH], const char *text) {
+static void copy_whole_tokens(char (&work)[LINE_BUFFER_WIDTH], const char *text) {
     if (copy_text(work, text) == 0) return;
-    if (is_delimiter(text[LIST_TEXT_WIDTH - 1])) return;
+    if (is_delimiter(text[LINE_BUFFER_WIDTH - 1])) return;
     size_t keep = strlen(work);
     while (keep > 0 && !is_delimiter(work[keep - 1])) --keep;
     work[keep] = '\0';
@@ -109,7 +109,7 @@ int expand_user_list(const char *list_text, NameNode **list_out) {
     NameNode *head = new_name_node();
     *list_out = head;
     if (head == nullptr) return -1;
-    char work[LIST_TEXT_WIDTH] = {};
+    char work[LINE_BUFFER_WIDTH] = {};
     copy_whole_tokens(work, list_text);
     NameNode *open_slot = head;
     for (char *token = smb_strtok(work, LIST_DELIMITERS); token != nullptr;

@@ -14,6 +14,9 @@ struct NameNode {
 
 NameNode *new_name_node();
 void free_name_list(NameNode *head);
+// True when a node of the list holds exactly `name` (the empty open slot
+// holds the empty name).
+bool name_list_holds(const NameNode *head, const char *name);
 // Members of group `group_name` in database order, no open slot; an unknown
 // or memberless group gives one empty node. 0, or -1 when memory runs out
 // (nothing stored).

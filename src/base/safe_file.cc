@@ -1,29 +1,157 @@
 #include "base/safe_file.h"
 
+#include <cerrno>
+#include <cstdlib>
 #include <cstring>
 #include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
-int open_no_follow(const char *path, int flags, mode_t mode) {
-    return open(path, flags | O_NOFOLLOW | O_CLOEXEC, mode);
-}
+#include "base/appliance_paths.h"
+#include "base/text_field.h"
 
-static int open_flags_for(const char *mode) {
-    bool update = strchr(mode, '+') != nullptr;
-    switch (mode[0]) {
-    case 'r': return update ? O_RDWR : O_RDONLY;
-    case 'w': return (update ? O_RDWR : O_WRONLY) | O_CREAT | O_TRUNC;
-    case 'a': return (update ? O_RDWR : O_WRONLY) | O_CREAT | O_APPEND;
-    default: return -1;
+static const int NO_SURPRISES = O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+
+static int keep_if_own_regular(int fd) {
+    struct stat status;
+    if (fd == -1) return -1;
+    if (fstat(fd, &status) != 0 || !S_ISREG(status.st_mode) || status.st_uid != geteuid() ||
+        fcntl(fd, F_SETFL, fcntl(fd, F_GETFL) & ~O_NONBLOCK) != 0) {
+        close(fd);
+        return -1;
     }
+    return fd;
 }
 
-FILE *fopen_no_follow(const char *path, const char *mode) {
-    int flags = open_flags_for(mode);
-    if (flags == -1) return nullptr;
-    int fd = open_no_follow(path, flags, 0644);
-    if (fd == -1) return nullptr;
-    FILE *file = fdopen(fd, mode);
-    if (file == nullptr) close(fd);
+int open_own_regular(const char *path, int flags, mode_t mode) {
+    return keep_if_own_regular(open(path, flags | NO_SURPRISES, mode));
+}
+
+int open_own_regular_at(int dir_fd, const char *name, int flags, mode_t mode) {
+    return keep_if_own_regular(openat(dir_fd, name, flags | NO_SURPRISES, mode));
+}
+
+int touch_own_file(const char *path) {
+    int fd = open_own_regular(path, O_WRONLY | O_CREAT, 0644);
+    if (fd == -1) return -1;
+    int result = futimens(fd, nullptr);
+    return close(fd) == 0 ? result : -1;
+}
+
+static bool write_all(int fd, const char *data, size_t length) {
+    while (length > 0) {
+        ssize_t put = write(fd, data, length);
+        if (put < 0 && errno == EINTR) continue;
+        if (put <= 0) return false;
+        data += put;
+        length -= static_cast<size_t>(put);
+    }
+    return true;
+}
+
+// "<dir>/.<name>.XXXXXX": beside the target, so the rename stays on one
+// file system, and hidden from a reader of the folder.
+static int temporary_beside(char (&temporary)[4096], const char *path) {
+    const char *slash = strrchr(path, '/');
+    int dir_length = slash == nullptr ? 0 : static_cast<int>(slash - path + 1);
+    return format_text_field(temporary, sizeof temporary, "%.*s.%s.XXXXXX", dir_length, path,
+                             path + dir_length);
+}
+
+int replacement_write(Replacement *replacement, const char *path, const char *data,
+                      size_t length, mode_t mode) {
+    replacement->path = path;
+    replacement->temporary[0] = '\0';
+    if (temporary_beside(replacement->temporary, path) != 0) return -1;
+    int fd = mkostemp(replacement->temporary, O_CLOEXEC);
+    if (fd == -1) {
+        replacement->temporary[0] = '\0';
+        return -1;
+    }
+    bool written = write_all(fd, data, length) && fchmod(fd, mode) == 0 && fsync(fd) == 0;
+    written = close(fd) == 0 && written;
+    if (written) return 0;
+    replacement_abandon(replacement);
+    return -1;
+}
+
+int replacement_commit(Replacement *replacement) {
+    if (replacement->temporary[0] == '\0') return -1;
+    if (rename(replacement->temporary, replacement->path) == 0) {
+        replacement->temporary[0] = '\0';
+        return 0;
+    }
+    replacement_abandon(replacement);
+    return -1;
+}
+
+void replacement_abandon(Replacement *replacement) {
+    if (replacement->temporary[0] != '\0') unlink(replacement->temporary);
+    replacement->temporary[0] = '\0';
+}
+
+int replace_file(const char *path, const char *data, size_t length, mode_t mode) {
+    Replacement replacement;
+    if (replacement_write(&replacement, path, data, length, mode) != 0) return -1;
+    return replacement_commit(&replacement);
+}
+
+int open_dir_no_links(const char *path) {
+    if (path[0] != '/') return -1;
+    int dir_fd = open("/", O_PATH | O_DIRECTORY | O_CLOEXEC);
+    for (const char *at = path + 1; dir_fd != -1 && *at != '\0';) {
+        size_t length = strcspn(at, "/");
+        char name[LINE_BUFFER_WIDTH];
+        if (copy_text_prefix(name, sizeof name, at, length) != 0 || strcmp(name, ".") == 0 ||
+            strcmp(name, "..") == 0) {
+            close(dir_fd);
+            return -1;
+        }
+        at += length;
+        while (*at == '/') ++at;
+        if (name[0] == '\0') continue;
+        int next = openat(dir_fd, name, O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+        close(dir_fd);
+        dir_fd = next;
+    }
+    return dir_fd;
+}
+
+FILE *open_locked_for_reading(const char *path) {
+    FILE *file = fopen(path, "re");
+    if (file == nullptr) return nullptr;
+    if (flock(fileno(file), LOCK_EX) != 0) {
+        fclose(file);
+        return nullptr;
+    }
     return file;
+}
+
+void close_locked(FILE *file) {
+    flock(fileno(file), LOCK_UN);
+    fclose(file);
+}
+
+int memory_file_open(MemoryFile *file) {
+    file->text = nullptr;
+    file->length = 0;
+    file->stream = open_memstream(&file->text, &file->length);
+    return file->stream != nullptr ? 0 : -1;
+}
+
+int memory_file_close(MemoryFile *file) {
+    if (file->stream == nullptr) return -1;
+    bool failed = ferror(file->stream) != 0;
+    failed = fclose(file->stream) != 0 || failed;
+    file->stream = nullptr;
+    return failed ? -1 : 0;
+}
+
+void memory_file_free(MemoryFile *file) {
+    if (file->stream != nullptr) fclose(file->stream);
+    free(file->text);
+    file->stream = nullptr;
+    file->text = nullptr;
+    file->length = 0;
 }

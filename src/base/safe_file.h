@@ -1,16 +1,57 @@
-// Files the tool writes under /tmp. The directory is writable by others, so a
-// symbolic link planted at one of our names must make the open fail rather
-// than redirect the write.
+// Files the tool writes. /tmp is writable by every user and a USB volume
+// belongs to whoever plugged it in, so nothing planted there (a link, a FIFO,
+// a folder, another user's file) may be followed or used, and a file that
+// replaces another only appears once it is complete.
 #ifndef DAVSYNC_BASE_SAFE_FILE_H
 #define DAVSYNC_BASE_SAFE_FILE_H
 
+#include <cstddef>
 #include <cstdio>
 #include <sys/types.h>
 
-// open(2) with O_NOFOLLOW added; -1 on failure (a link in place included).
-int open_no_follow(const char *path, int flags, mode_t mode);
-// fopen(3) modes "r", "w", "w+", "a" over open_no_follow; new files get 0644
-// before the umask. Null on failure.
-FILE *fopen_no_follow(const char *path, const char *mode);
+// open(2) that never follows a link at the last step, never blocks on a FIFO
+// and gives -1 unless the result is a regular file owned by this process's
+// user. The descriptor is blocking again when returned.
+[[nodiscard]] int open_own_regular(const char *path, int flags, mode_t mode);
+// Same, relative to the directory `dir_fd`.
+[[nodiscard]] int open_own_regular_at(int dir_fd, const char *name, int flags, mode_t mode);
+// Creates the file or updates its times, like touch(1), with the checks above.
+int touch_own_file(const char *path);
+
+// Replaces `path` by a file holding `length` bytes of `data`: written to a
+// new hidden file beside it, synced, then renamed over it. -1 when any step
+// fails; the old file is then untouched.
+[[nodiscard]] int replace_file(const char *path, const char *data, size_t length, mode_t mode);
+// The same in two steps, for a caller with work to do between them.
+struct Replacement {
+    char temporary[4096];
+    const char *path;
+};
+[[nodiscard]] int replacement_write(Replacement *replacement, const char *path, const char *data,
+                                    size_t length, mode_t mode);
+[[nodiscard]] int replacement_commit(Replacement *replacement);
+void replacement_abandon(Replacement *replacement);
+
+// An O_PATH descriptor of the directory `path`, resolved component by
+// component without following any link; "." and ".." are refused. -1 on
+// failure.
+[[nodiscard]] int open_dir_no_links(const char *path);
+
+// A system file read under an exclusive flock, as its other users expect.
+// Null when it cannot be opened or locked.
+FILE *open_locked_for_reading(const char *path);
+void close_locked(FILE *file);
+
+// A stream into memory for a file built whole before it is written, so that
+// every write failure shows once, at the end.
+struct MemoryFile {
+    FILE *stream;
+    char *text;
+    size_t length;
+};
+[[nodiscard]] int memory_file_open(MemoryFile *file);
+// Closes the stream; 0 when everything written is in file->text.
+[[nodiscard]] int memory_file_close(MemoryFile *file);
+void memory_file_free(MemoryFile *file);
 
 #endif

@@ -4,34 +4,22 @@
 #include <cstdio>
 #include <cstring>
 
-// Writes at most `count` characters of text and a terminator; the length
-// written, with *cut set when the text had to be shortened.
-static size_t write_terminated(char *field, size_t width, const char *text, size_t count, int *cut) {
-    if (text == nullptr) text = "";
-    size_t length = strnlen(text, count);
-    *cut = 0;
-    if (length > width - 1) {
-        length = width - 1;
-        *cut = -1;
-    }
-    memmove(field, text, length);
-    field[length] = '\0';
-    return length;
-}
+static bool is_utf8_continuation(char c) { return (static_cast<unsigned char>(c) & 0xC0) == 0x80; }
 
 int copy_text_prefix(char *field, size_t width, const char *text, size_t count) {
     if (field == nullptr || width == 0) return -1;
-    int cut;
-    size_t length = write_terminated(field, width, text, count, &cut);
-    memset(field + length, 0, width - length);
-    return cut;
-}
-
-int store_text_field(char *field, size_t width, const char *text) {
-    if (field == nullptr || width == 0) return -1;
-    int cut;
-    write_terminated(field, width, text, width, &cut);
-    return cut;
+    if (text == nullptr) text = "";
+    size_t length = strnlen(text, count);
+    int result = 0;
+    if (length > width - 1) {
+        length = width - 1;
+        // text[length] is the first byte left out; never split a character there.
+        while (length > 0 && is_utf8_continuation(text[length])) --length;
+        result = -1;
+    }
+    memmove(field, text, length);
+    field[length] = '\0';
+    return result;
 }
 
 int copy_text_field(char *field, size_t width, const char *text) {
@@ -43,14 +31,12 @@ int append_text_field(char *field, size_t width, const char *text) {
     size_t used = strnlen(field, width - 1);
     size_t length = strlen(text);
     if (length > width - 1 - used) return -1;
-    memcpy(field + used, text, length);
-    memset(field + used + length, 0, width - used - length);
+    memcpy(field + used, text, length + 1);
     return 0;
 }
 
 int format_text_field(char *field, size_t width, const char *format, ...) {
     if (field == nullptr || width == 0) return -1;
-    memset(field, 0, width);
     va_list args;
     va_start(args, format);
     int needed = vsnprintf(field, width, format, args);

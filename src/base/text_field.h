@@ -1,7 +1,8 @@
 // Bounded text fields. Every fixed-width text field and buffer of the tool is
 // filled through these helpers: they never write past the width (which counts
-// the terminating NUL), always terminate, and zero-fill what is left.
-// Each returns 0 when the whole text fit and -1 when it had to be cut.
+// the terminating NUL) and always terminate. A text that must be cut is cut
+// at a UTF-8 character boundary, so a cut name is still valid text.
+// Each returns 0 when the whole text fit and -1 when it did not.
 #ifndef DAVSYNC_BASE_TEXT_FIELD_H
 #define DAVSYNC_BASE_TEXT_FIELD_H
 
@@ -13,9 +14,7 @@ int copy_text_prefix(char *field, size_t width, const char *text, size_t count);
 // Appends `text` behind the text already in the field; on -1 the field is
 // left exactly as it was (nothing partial is appended).
 int append_text_field(char *field, size_t width, const char *text);
-// For a field known to be zero-filled already: writes the text and its
-// terminator only, so the untouched rest of a large field is never paged in.
-int store_text_field(char *field, size_t width, const char *text);
+// printf into the field; on -1 the field holds nothing usable.
 int format_text_field(char *field, size_t width, const char *format, ...)
     __attribute__((format(printf, 3, 4)));
 

@@ -3,6 +3,7 @@
 #include <cstring>
 #include <unistd.h>
 
+#include "base/appliance_paths.h"
 #include "base/text_field.h"
 #include "cli/decode.h"
 #include "cli/usage.h"
@@ -15,7 +16,6 @@
 #include "cycle/start_stop.h"
 
 static const int BAD_CALL = 255;
-static const size_t VOLUME_ROOT_LENGTH = 14;  // "/mnt/HD/HD_a2/"
 
 static int bad_call() {
     print_usage();
@@ -33,12 +33,13 @@ static bool decode_into_area(const char *argument, char *area) {
     return strlen(argument) < ARGUMENT_AREA_WIDTH && decode_argument(argument, area) == 0;
 }
 
-// A volume root gains its '/', any other path loses one trailing '/'.
+// A volume directory gains its '/', a volume root stays, any other path
+// loses one trailing '/'.
 static void normalise_trailing_slash(char *path) {
     size_t length = strlen(path);
-    if (length == VOLUME_ROOT_LENGTH - 1)
-        path[length] = '/';
-    else if (length != VOLUME_ROOT_LENGTH && length > 0 && path[length - 1] == '/')
+    if (length == VOLUME_PREFIX_LENGTH)
+        append_volume_root_slash(path, ARGUMENT_AREA_WIDTH);
+    else if (length != VOLUME_PREFIX_LENGTH + 1 && length > 0 && path[length - 1] == '/')
         path[length - 1] = '\0';
 }
 

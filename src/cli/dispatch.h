@@ -4,7 +4,9 @@
 #ifndef DAVSYNC_CLI_DISPATCH_H
 #define DAVSYNC_CLI_DISPATCH_H
 
-constexpr int ARGUMENT_AREA_WIDTH = 12800;
+#include "base/appliance_paths.h"
+
+constexpr size_t ARGUMENT_AREA_WIDTH = LINE_BUFFER_WIDTH;
 
 int dispatch_command(int argc, char **argv);
 

@@ -3,19 +3,14 @@
 #include <cstring>
 #include <unistd.h>
 
+#include "base/appliance_paths.h"
 #include "base/text_field.h"
 #include "cycle/regeneration.h"
 
-// The start cycle, with the entries moved between loading and reconciling.
-static const CycleVariant CHG_VARIANT = {
-    /*lock_taken_first=*/false, /*wait_start_lock=*/true, /*clear_start_lock=*/true,
-    /*read_enable_flag=*/true, RECONCILE_PATH, ALLEN_ONE, WRITE_FIXED_DIRECTORIES,
-    /*prepare_link_dir=*/true, /*remove_links_after_conf=*/false,
-};
-
-// Entries follow the folder only while it is still there under its old path.
+// Entries follow the folder only while it is still there under its old
+// path, and only to a place that can be shared at all.
 static void move_entries(DavShareEntry *entries, const char *old_path, const char *new_path) {
-    if (access(old_path, F_OK) != 0) return;
+    if (access(old_path, F_OK) != 0 || !is_shareable_path(new_path)) return;
     size_t old_length = strlen(old_path);
     for (DavShareEntry *entry = entries; entry != nullptr; entry = entry->next) {
         if (entry->path[0] == '\0' || strncmp(entry->path, old_path, old_length) != 0) continue;
@@ -30,7 +25,7 @@ int webdav_chg(const char *old_argument, const char *new_argument) {
     if (copy_text(old_path, old_argument) != 0 || copy_text(new_path, new_argument) != 0)
         return -1;
     CycleRun run;
-    if (cycle_begin(&run, &CHG_VARIANT, -1) < 0) return -1;
+    if (cycle_begin(&run, start_variant(), -1) < 0) return -1;
     move_entries(run.entries, old_path, new_path);
     return cycle_finish(&run);
 }

@@ -4,19 +4,17 @@
 #include <cstring>
 #include <unistd.h>
 
+#include "base/appliance_paths.h"
+#include "base/safe_file.h"
 #include "base/text_field.h"
 #include "cycle/regeneration.h"
 
-static const CycleVariant DEL_VARIANT = {
-    /*lock_taken_first=*/false, /*wait_start_lock=*/false, /*clear_start_lock=*/false,
-    /*read_enable_flag=*/true, RECONCILE_NAME_AND_PATH, ALLEN_ENABLE_FLAG,
-    WRITE_CHOSEN_DIRECTORIES, /*prepare_link_dir=*/false, /*remove_links_after_conf=*/false,
-};
-
+// No link on the way into the USB folder is followed.
 static void remove_usb_marker(const char *path) {
-    char marker[512 + 16];
-    if (format_text_field(marker, sizeof marker, "%s/.davconf", path) != 0) return;
-    if (access(marker, F_OK) == 0) unlink(marker);
+    int dir_fd = open_dir_no_links(path);
+    if (dir_fd == -1) return;
+    unlinkat(dir_fd, USB_MARKER, 0);
+    close(dir_fd);
 }
 
 // The list keeps at least one entry: the only entry is emptied, not freed.
@@ -38,19 +36,19 @@ static void remove_entry(DavShareEntry **entries, DavShareEntry *doomed) {
 int webdav_del(const char *given_path) {
     char path[512];
     if (copy_text(path, given_path) != 0) return -1;  // no entry has so long a path
-    bool usb = strncmp(path, "/mnt/USB/", 9) == 0;
+    bool usb = is_usb_path(path);
     if (usb) remove_usb_marker(path);
 
+    CycleVariant variant = editing_variant();
+    variant.writer = WRITE_CHOSEN_DIRECTORIES;
     CycleRun run;
-    if (cycle_begin(&run, &DEL_VARIANT, -1) < 0) return -1;
+    if (cycle_begin(&run, variant, -1) < 0) return -1;
     DavShareEntry *found = run.entries;
     while (found != nullptr && (found->path[0] == '\0' || strcmp(found->path, path) != 0))
         found = found->next;
     if (found == nullptr && !usb) return cycle_abort(&run);
     if (found != nullptr) {
-        char prefix[PATH_NODE_WIDTH];
-        volume_prefix(path, prefix);
-        path_list_add(prefix, run.volume_dirs);
+        add_volume_prefix(path, run.volume_dirs);
         remove_entry(&run.entries, found);
     }
     return cycle_finish(&run);

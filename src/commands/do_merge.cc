@@ -4,32 +4,34 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "base/appliance_paths.h"
 #include "base/safe_file.h"
 #include "base/text_field.h"
 #include "cycle/regeneration.h"
 #include "cycle/run_locks.h"
 
-static const CycleVariant DO_MERGE_VARIANT = {
-    /*lock_taken_first=*/true, /*wait_start_lock=*/false, /*clear_start_lock=*/false,
-    /*read_enable_flag=*/true, RECONCILE_NAME_AND_PATH, ALLEN_ENABLE_FLAG,
-    WRITE_CHOSEN_DIRECTORIES, /*prepare_link_dir=*/true, /*remove_links_after_conf=*/false,
-};
-
-static bool is_usb_path(const char *path) { return strncmp(path, "/mnt/USB/", 9) == 0; }
-
 // USB folders are published by a marker in the folder itself. The folder
-// belongs to whoever plugged the volume in, so a link there is not followed.
+// belongs to whoever plugged the volume in, so no link on the way is followed.
+static void write_usb_marker(const char *folder) {
+    int dir_fd = open_dir_no_links(folder);
+    if (dir_fd == -1) return;
+    int fd = open_own_regular_at(dir_fd, USB_MARKER, O_WRONLY | O_CREAT | O_TRUNC, 0644);
+    close(dir_fd);
+    if (fd == -1) return;
+    ssize_t written = write(fd, "ON", 2);
+    (void)written;
+    close(fd);
+}
+
+// Anything that is not a volume folder or below one (a path of "/" would
+// publish the whole file system) is no input at all.
+static bool is_input_item(const DavShareEntry *item) {
+    return item->path[0] != '\0' && is_shareable_path(item->path);
+}
+
 static void write_usb_markers(const DavShareEntry *input) {
-    for (const DavShareEntry *item = input; item != nullptr; item = item->next) {
-        if (item->path[0] == '\0' || !is_usb_path(item->path)) continue;
-        char marker[DAV_TEXT_WIDTH + 16];
-        if (format_text_field(marker, sizeof marker, "%s/.davconf", item->path) != 0) continue;
-        int fd = open_no_follow(marker, O_WRONLY | O_CREAT | O_TRUNC, 0644);
-        if (fd == -1) continue;
-        ssize_t written = write(fd, "ON", 2);
-        (void)written;
-        close(fd);
-    }
+    for (const DavShareEntry *item = input; item != nullptr; item = item->next)
+        if (is_input_item(item) && is_usb_path(item->path)) write_usb_marker(item->path);
 }
 
 static DavShareEntry *find_entry_by_path(DavShareEntry *entries, const char *path) {
@@ -65,9 +67,10 @@ static void insert_by_volume(DavShareEntry **entries, DavShareEntry *added) {
 }
 
 static void apply_input_item(CycleRun *run, const DavShareEntry *item, int merge) {
+    if (!is_input_item(item)) return;
     char path[DAV_TEXT_WIDTH];
     copy_text(path, item->path);
-    if (strlen(path) == VOLUME_PREFIX_LENGTH) append_text(path, "/");
+    append_volume_root_slash(path, sizeof path);
     if (is_usb_path(path)) return;
 
     DavShareEntry *existing = find_entry_by_path(run->entries, path);
@@ -83,9 +86,7 @@ static void apply_input_item(CycleRun *run, const DavShareEntry *item, int merge
     } else {
         set_entry(run->entries, item, path);
     }
-    char prefix[PATH_NODE_WIDTH];
-    volume_prefix(path, prefix);
-    path_list_add(prefix, run->volume_dirs);
+    add_volume_prefix(path, run->volume_dirs);
 }
 
 int webdav_do_merge(const char *file_name, int merge) {
@@ -98,8 +99,11 @@ int webdav_do_merge(const char *file_name, int merge) {
     }
     write_usb_markers(input);
 
+    CycleVariant variant = editing_variant();
+    variant.lock_taken_first = true;
+    variant.writer = WRITE_CHOSEN_DIRECTORIES;
     CycleRun run;
-    if (cycle_begin(&run, &DO_MERGE_VARIANT, node_lock) < 0) {
+    if (cycle_begin(&run, variant, node_lock) < 0) {
         free_dav_share_list(input);
         return -1;
     }

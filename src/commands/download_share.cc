@@ -3,18 +3,12 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
-#include <sys/file.h>
 
+#include "base/safe_file.h"
 #include "base/text_field.h"
 #include "cycle/regeneration.h"
 #include "platform/apkg_lib.h"
 #include "platform/config_db.h"
-
-static const CycleVariant DOWNLOAD_SHARE_VARIANT = {
-    /*lock_taken_first=*/false, /*wait_start_lock=*/false, /*clear_start_lock=*/false,
-    /*read_enable_flag=*/true, RECONCILE_NAME_AND_PATH, ALLEN_ENABLE_FLAG, WRITE_ALL_VOLUMES,
-    /*prepare_link_dir=*/true, /*remove_links_after_conf=*/false,
-};
 
 static const char VOLUME_MARK[] = "/mnt/HD/HD_";
 
@@ -80,21 +74,18 @@ static int volume_index_in_save_path_line(const char *line) {
     return index < 0 ? -1 : index;
 }
 
-int read_p2p_save_volume() {
-    FILE *settings = fopen("/etc/NAS_CFG/p2psettings.xml", "r");
+int read_p2p_save_volume_in(const char *file_path) {
+    FILE *settings = open_locked_for_reading(file_path);
     if (settings == nullptr) return -1;
-    if (flock(fileno(settings), LOCK_EX) != 0) {
-        fclose(settings);
-        return -1;
-    }
     char line[1024] = {};
     bool found = false;
     while (!found && fgets(line, sizeof line, settings) != nullptr)
         found = strstr(line, "save_path") != nullptr;
-    flock(fileno(settings), LOCK_UN);
-    fclose(settings);
+    close_locked(settings);
     return found ? volume_index_in_save_path_line(line) : -1;
 }
+
+int read_p2p_save_volume() { return read_p2p_save_volume_in("/etc/NAS_CFG/p2psettings.xml"); }
 
 int add_p2p_share_entry(DavShareEntry *entries) {
     if (xml_get_int("/download_mgr/p2p/enable") != 1) return -1;
@@ -132,16 +123,22 @@ int add_amule_share_entry(DavShareEntry *entries) {
     return add_download_entry(entries, volume_index, &AMULE_KIND);
 }
 
+static CycleVariant download_share_variant() {
+    CycleVariant variant = editing_variant();
+    variant.writer = WRITE_ALL_VOLUMES;
+    return variant;
+}
+
 int webdav_p2p_share() {
     CycleRun run;
-    if (cycle_begin(&run, &DOWNLOAD_SHARE_VARIANT, -1) < 0) return -1;
+    if (cycle_begin(&run, download_share_variant(), -1) < 0) return -1;
     add_p2p_share_entry(run.entries);
     return cycle_finish(&run);
 }
 
 int webdav_amule_share() {
     CycleRun run;
-    if (cycle_begin(&run, &DOWNLOAD_SHARE_VARIANT, -1) < 0) return -1;
+    if (cycle_begin(&run, download_share_variant(), -1) < 0) return -1;
     add_amule_share_entry(run.entries);
     return cycle_finish(&run);
 }

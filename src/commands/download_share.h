@@ -12,6 +12,8 @@ int webdav_amule_share();
 int add_p2p_share_entry(DavShareEntry *entries);
 int add_amule_share_entry(DavShareEntry *entries);
 // Volume index of the p2p download location in the settings file, or -1.
+// The _in form reads the given file.
 int read_p2p_save_volume();
+int read_p2p_save_volume_in(const char *file_path);
 
 #endif

@@ -2,45 +2,32 @@
 
 #include <cstdio>
 #include <cstring>
-#include <sys/file.h>
 #include <unistd.h>
 
+#include "base/appliance_paths.h"
 #include "base/safe_file.h"
 #include "base/text_field.h"
 #include "cycle/regeneration.h"
 
-static const char QUERY_FILE[] = "/tmp/webdav_query.xml";
-static const int LINE_WIDTH = 12800;
-
+// Replaced whole, so the caller never reads a half-written answer.
 int write_webdav_query(const DavShareEntry *answer) {
-    FILE *file = fopen_no_follow(QUERY_FILE, "w");
-    if (file == nullptr) return -1;
-    if (flock(fileno(file), LOCK_EX) != 0) {
-        fclose(file);
+    char text[LINE_BUFFER_WIDTH];
+    if (format_text_field(text, sizeof text,
+                          "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n"
+                          "\t\t<item>\n\t\t\t<shared_name>%s</shared_name>\n\t\t\t<path>%s</path>\n"
+                          "\t\t\t<enable>%d</enable>\n\t\t</item>\n\t</WebDAV>\n</config>\n",
+                          answer->shared_name, answer->path, answer->enable) != 0)
         return -1;
-    }
-    char line[LINE_WIDTH];
-    fputs("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n\t\t<item>\n", file);
-    format_text_field(line, sizeof line, "\t\t\t<shared_name>%s</shared_name>\n", answer->shared_name);
-    fputs(line, file);
-    format_text_field(line, sizeof line, "\t\t\t<path>%s</path>\n", answer->path);
-    fputs(line, file);
-    format_text_field(line, sizeof line, "\t\t\t<enable>%d</enable>\n", answer->enable);
-    fputs(line, file);
-    fputs("\t\t</item>\n\t</WebDAV>\n</config>\n", file);
-    fflush(file);
-    flock(fileno(file), LOCK_UN);
-    fclose(file);
-    return 0;
+    return replace_file(QUERY_FILE, text, strlen(text), 0644);
 }
 
 // A USB folder is published when its ".davconf" marker exists; WebDAV's own
 // switch is not consulted for it.
 static int answer_usb_folder(const char *query_path, DavShareEntry *answer) {
-    char marker[LINE_WIDTH];
-    if (format_text_field(marker, sizeof marker, "%s/.davconf", query_path) != 0) return 0;
+    char marker[LINE_BUFFER_WIDTH];
+    if (format_text_field(marker, sizeof marker, "%s/%s", query_path, USB_MARKER) != 0) return 0;
     if (access(marker, F_OK) != 0) return 0;
-    copy_text(answer->shared_name, query_path + 9);
+    copy_text(answer->shared_name, usb_folder_name(query_path));
     copy_text(answer->path, query_path);
     answer->enable = 1;
     write_webdav_query(answer);
@@ -50,7 +37,7 @@ static int answer_usb_folder(const char *query_path, DavShareEntry *answer) {
 // Escaping can grow a text sixfold; an answer that no longer fits its field is
 // refused rather than cut in the middle of an entity.
 static bool copy_escaped(const char *text, char *field, size_t width) {
-    char escaped[LINE_WIDTH] = {};
+    char escaped[XML_ESCAPE_WIDTH] = {};
     if (escape_xml_text(text, escaped) != 0) return false;
     return copy_text_field(field, width, escaped) == 0;
 }
@@ -83,10 +70,10 @@ static int answer_volume_folder(const char *query_path, DavShareEntry *answer) {
 int webdav_get(const char *folder) {
     char query_path[DAV_TEXT_WIDTH];
     if (copy_text(query_path, folder) != 0) return 0;  // no folder has so long a path
-    if (strlen(query_path) == VOLUME_PREFIX_LENGTH) append_text(query_path, "/");
+    append_volume_root_slash(query_path, sizeof query_path);
     DavShareEntry *answer = new_dav_share_entry();
     if (answer == nullptr) return -1;
-    int result = strncmp(query_path, "/mnt/USB/", 9) == 0
+    int result = is_usb_path(query_path)
                      ? answer_usb_folder(query_path, answer)
                      : answer_volume_folder(query_path, answer);
     free_dav_share_list(answer);

@@ -1,19 +1,36 @@
 #include "cycle/regeneration.h"
 
 #include <cstring>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include "base/shell_command.h"
 #include "base/text_field.h"
 #include "cycle/run_locks.h"
+#include "output/conf_build.h"
 #include "output/dav_conf.h"
 #include "output/usb_shares.h"
 #include "output/webdav_note.h"
 #include "platform/config_db.h"
 
-static const char LINK_DIR[] = "/usr/local/apache2_dav/webdav";
-static const char REMOVE_LINKS[] = "rm /usr/local/apache2_dav/webdav/* > /dev/null 2>&1";
+CycleVariant start_variant() {
+    CycleVariant variant;
+    variant.lock_taken_first = false;
+    variant.wait_start_lock = true;
+    variant.clear_start_lock = true;
+    variant.read_enable_flag = true;
+    variant.rule = RECONCILE_PATH;
+    variant.allen = ALLEN_ONE;
+    variant.writer = WRITE_FIXED_DIRECTORIES;
+    return variant;
+}
+
+CycleVariant editing_variant() {
+    CycleVariant variant = start_variant();
+    variant.wait_start_lock = false;
+    variant.clear_start_lock = false;
+    variant.rule = RECONCILE_NAME_AND_PATH;
+    variant.allen = ALLEN_ENABLE_FLAG;
+    return variant;
+}
 
 // A switch of the configuration database is on only when its text is exactly "1".
 static bool config_switch_on(const char *slash_path) {
@@ -23,10 +40,6 @@ static bool config_switch_on(const char *slash_path) {
 }
 
 int read_webdav_enable_flag() { return config_switch_on("/system_mgr/webdav/enable") ? 1 : 0; }
-
-void volume_prefix(const char *path, char out[PATH_NODE_WIDTH]) {
-    copy_text_prefix(out, PATH_NODE_WIDTH, path, VOLUME_PREFIX_LENGTH);
-}
 
 static void release_node_lock(CycleRun *run) {
     if (!run->lock_taken) return;
@@ -38,35 +51,32 @@ static void free_run_objects(CycleRun *run) {
     free_dav_share_list(run->entries);
     free_share_catalogue(run->catalogue);
     free_path_list(run->volume_dirs);
-    free_path_list(run->published);
     run->entries = nullptr;
     run->catalogue = nullptr;
     run->volume_dirs = nullptr;
-    run->published = nullptr;
 }
 
 int cycle_abort(CycleRun *run) {
     free_run_objects(run);
     release_node_lock(run);
-    if (run->variant->clear_start_lock) start_lock_clear();
+    if (run->variant.clear_start_lock) start_lock_clear();
     return -1;
 }
 
-int cycle_begin(CycleRun *run, const CycleVariant *variant, int node_lock) {
+int cycle_begin(CycleRun *run, const CycleVariant &variant, int node_lock) {
     memset(run, 0, sizeof *run);
     run->variant = variant;
-    if (variant->wait_start_lock) start_lock_wait_and_mark();
+    if (variant.wait_start_lock) start_lock_wait_and_mark();
     run->volume_dirs = new_path_node();
-    run->published = new_path_node();
-    run->node_lock = variant->lock_taken_first ? node_lock : lock_node_file();
+    run->node_lock = variant.lock_taken_first ? node_lock : lock_node_file();
     run->lock_taken = true;
-    if (run->volume_dirs == nullptr || run->published == nullptr) return cycle_abort(run);
+    if (run->volume_dirs == nullptr) return cycle_abort(run);
 
     run->entries = new_dav_share_entry();
     int allen_unused = 0;
     if (run->entries == nullptr || load_dav_share_lists(run->entries, &allen_unused) < 0)
         return cycle_abort(run);
-    run->webdav_enable = variant->read_enable_flag ? read_webdav_enable_flag() : 0;
+    run->webdav_enable = variant.read_enable_flag ? read_webdav_enable_flag() : 0;
     return 0;
 }
 
@@ -95,7 +105,7 @@ static void add_fixed_volume_dirs(PathNode *volume_dirs) {
 }
 
 static int allen_value(const CycleRun *run) {
-    switch (run->variant->allen) {
+    switch (run->variant.allen) {
     case ALLEN_ONE: return 1;
     case ALLEN_ZERO: return 0;
     case ALLEN_ENABLE_FLAG: break;
@@ -105,7 +115,7 @@ static int allen_value(const CycleRun *run) {
 
 static void write_share_lists(CycleRun *run) {
     int allen = allen_value(run);
-    switch (run->variant->writer) {
+    switch (run->variant.writer) {
     case WRITE_ALL_VOLUMES:
         write_volume_share_lists(run->entries, allen);
         return;
@@ -118,37 +128,27 @@ static void write_share_lists(CycleRun *run) {
     write_dav_share_lists(run->entries, run->volume_dirs, allen);
 }
 
-static void prepare_link_dir() {
-    struct stat status;
-    if (stat(LINK_DIR, &status) == 0)
-        run_shell_command(REMOVE_LINKS);
-    else
-        run_shell_command("mkdir -p /usr/local/apache2_dav/webdav > /dev/null 2>&1");
-}
-
-static void update_note_file(const DavShareEntry *entries) {
-    if (config_switch_on("/system_mgr/samba/ads_enable"))
-        unlink(WEBDAV_NOTE_FILE);
-    else
-        write_webdav_note(entries);
+// Configuration, note file, USB sections and links, built whole, then placed.
+static void build_and_place_conf(const CycleRun *run) {
+    ConfBuild build;
+    if (conf_build_open(&build) != 0) return;
+    write_dav_conf(&build, run->webdav_enable, run->entries, run->catalogue);
+    if (!config_switch_on("/system_mgr/samba/ads_enable")) write_webdav_note(&build, run->entries);
+    append_usb_shares(&build);
+    conf_build_place(&build);
+    conf_build_free(&build);
 }
 
 int cycle_finish(CycleRun *run) {
-    const CycleVariant *variant = run->variant;
     run->catalogue = new_share_record();
     if (run->catalogue == nullptr) return cycle_abort(run);
     if (read_share_catalogue(run->catalogue) < 0) return cycle_abort(run);
 
-    reconcile_entries(run->entries, run->catalogue, variant->rule);
+    reconcile_entries(run->entries, run->catalogue, run->variant.rule);
     write_share_lists(run);
-    if (variant->prepare_link_dir) prepare_link_dir();
-    write_dav_conf(run->webdav_enable, run->entries, run->published, run->catalogue);
-    if (variant->remove_links_after_conf) run_shell_command(REMOVE_LINKS);
-    update_note_file(run->entries);
-    append_usb_shares(run->published);
-    run_shell_command("mv /tmp/dav.conf /usr/local/apache2_dav/conf/extra/httpd-dav.conf");
+    build_and_place_conf(run);
 
-    if (variant->clear_start_lock) start_lock_clear();
+    if (run->variant.clear_start_lock) start_lock_clear();
     release_node_lock(run);
     run_shell_command(run->webdav_enable == 1 ? "apache restart dav" : "apache stop dav");
     free_run_objects(run);

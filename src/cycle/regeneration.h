@@ -1,12 +1,14 @@
 // The regeneration cycle every changing command ends in: load the WebDAV
 // share lists and the catalogue, reconcile them, write the lists back,
-// rebuild the links and /tmp/dav.conf, the note file and the USB sections,
-// place the configuration, release the marks, restart or stop the server.
+// build the configuration, the note file and the USB sections, bring the
+// link directory in line, place the configuration, release the marks,
+// restart or stop the server.
 //
 // A command runs cycle_begin (marks, lists, loading, enable flag), makes its
-// own change to run->entries, then cycle_finish. The variant states where a
-// command differs from "start". Any failure takes the failure exit: what
-// exists is freed, the marks are released, nothing is written or restarted.
+// own change to run->entries, then cycle_finish. Its CycleVariant says where
+// it differs from "start"; variants are made from start_variant() by
+// changing named fields. Any failure takes the failure exit: what exists is
+// freed, the marks are released, nothing is written or restarted.
 #ifndef DAVSYNC_CYCLE_REGENERATION_H
 #define DAVSYNC_CYCLE_REGENERATION_H
 
@@ -28,35 +30,38 @@ enum ListWriter {
 };
 
 struct CycleVariant {
-    bool lock_taken_first;       // the command holds the node lock before the cycle
-    bool wait_start_lock;        // wait for and mark the start lock first
-    bool clear_start_lock;       // remove the start-lock file at the end
-    bool read_enable_flag;       // otherwise WebDAV counts as disabled
+    bool lock_taken_first;  // the command holds the node lock before the cycle
+    bool wait_start_lock;   // wait for and mark the start lock first
+    bool clear_start_lock;  // remove the start-lock file at the end
+    bool read_enable_flag;  // otherwise WebDAV counts as disabled
     ReconcileRule rule;
     AllenValue allen;
     ListWriter writer;
-    bool prepare_link_dir;       // empty or create the link directory first
-    bool remove_links_after_conf;
 };
 
+// The start command's variant, from which every other is made.
+CycleVariant start_variant();
+// What the editing commands share: no start lock, the name-and-path rule,
+// allen from the enable flag.
+CycleVariant editing_variant();
+
 struct CycleRun {
-    const CycleVariant *variant;
+    CycleVariant variant;
     int node_lock;
-    bool lock_taken;             // node_lock still to be released
+    bool lock_taken;  // node_lock still to be released
     DavShareEntry *entries;
     ShareRecord *catalogue;
     PathNode *volume_dirs;
-    PathNode *published;
     int webdav_enable;
 };
 
-// Start lock (if the variant says so), path lists, node lock (the caller's
-// `node_lock` when the variant says it took the lock first; else it is
-// ignored), entry list loaded from all volumes, enable flag. 0, or -1 after
-// the failure exit.
-int cycle_begin(CycleRun *run, const CycleVariant *variant, int node_lock);
-// Catalogue, reconciliation, share lists, links, configuration, note file,
-// USB sections, placing, marks released, server restarted or stopped,
+// Start lock (if the variant says so), volume directory list, node lock (the
+// caller's `node_lock` when the variant says it took the lock first; else it
+// is ignored), entry list loaded from all volumes, enable flag. 0, or -1
+// after the failure exit.
+[[nodiscard]] int cycle_begin(CycleRun *run, const CycleVariant &variant, int node_lock);
+// Catalogue, reconciliation, share lists, configuration, note file, USB
+// sections, links, placing, marks released, server restarted or stopped,
 // everything freed. 0, or -1 after the failure exit.
 int cycle_finish(CycleRun *run);
 // The failure exit for a command that gives up between the two halves.
@@ -64,7 +69,5 @@ int cycle_abort(CycleRun *run);
 
 // The WebDAV enable flag: 1 exactly when /system_mgr/webdav/enable is "1".
 int read_webdav_enable_flag();
-// The volume prefix of a path (its first 13 characters) into `out`.
-void volume_prefix(const char *path, char out[PATH_NODE_WIDTH]);
 
 #endif

@@ -5,11 +5,11 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "base/appliance_paths.h"
 #include "base/safe_file.h"
-#include "base/shell_command.h"
 
-static const char NODE_LOCK_FILE[] = "/tmp/corvane.node";
-static const char START_LOCK_FILE[] = "/tmp/corvane_start_lock";
+// A planted object that cannot be removed (a folder) ends the attempts.
+static const int PLANTED_OBJECT_ATTEMPTS = 3;
 
 static int set_whole_file_lock(int fd, short type) {
     struct flock lock = {};
@@ -28,15 +28,36 @@ static int set_whole_file_lock(int fd, short type) {
 // granted a lock on a file nobody else will ever look at again.
 static bool still_named_by_path(int fd) {
     struct stat held, named;
-    if (fstat(fd, &held) != 0 || stat(NODE_LOCK_FILE, &named) != 0) return false;
+    if (fstat(fd, &held) != 0 || lstat(NODE_LOCK_FILE, &named) != 0) return false;
     return held.st_dev == named.st_dev && held.st_ino == named.st_ino;
+}
+
+// Our lock files are always this user's regular files; anything else at
+// the name was planted and goes. Our own file is never removed here: another
+// run may hold it.
+static bool is_planted(const char *path) {
+    struct stat status;
+    return lstat(path, &status) == 0 &&
+           (!S_ISREG(status.st_mode) || status.st_uid != geteuid());
+}
+
+static int open_node_lock_file() {
+    for (int attempt = 0; attempt < PLANTED_OBJECT_ATTEMPTS; ++attempt) {
+        int fd = open_own_regular(NODE_LOCK_FILE, O_RDWR | O_CREAT, 0644);
+        if (fd != -1) return fd;
+        if (!is_planted(NODE_LOCK_FILE) || unlink(NODE_LOCK_FILE) != 0) return -1;
+    }
+    return -1;
 }
 
 int lock_node_file() {
     for (;;) {
-        int fd = open_no_follow(NODE_LOCK_FILE, O_RDWR | O_CREAT, 0644);
+        int fd = open_node_lock_file();
         if (fd == -1) return -1;
-        if (set_whole_file_lock(fd, F_WRLCK) == -1) return fd;
+        if (set_whole_file_lock(fd, F_WRLCK) == -1) {
+            close(fd);
+            return -1;
+        }
         if (still_named_by_path(fd)) return fd;
         close(fd);
     }
@@ -56,7 +77,7 @@ void start_lock_wait_and_mark() {
         sleep(1);
         sleep(1);
     }
-    run_shell_command("touch /tmp/corvane_start_lock");
+    touch_own_file(START_LOCK_FILE);
 }
 
 void start_lock_clear() { unlink(START_LOCK_FILE); }

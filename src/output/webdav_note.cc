@@ -1,12 +1,12 @@
 #include "output/webdav_note.h"
 
-#include "output/conf_writer.h"
-
-int write_webdav_note(const DavShareEntry *entries) {
-    FILE *note = open_locked(WEBDAV_NOTE_FILE, "w");
-    if (note == nullptr) return -1;
+void write_webdav_note(ConfBuild *build, const DavShareEntry *entries) {
+    build->note_wanted = true;
     for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next)
-        if (entry->path[0] != '\0') write_note_line(note, entry->shared_name);
-    close_locked(note);
-    return 0;
+        if (entry->path[0] != '\0') write_note_line(build->note.stream, entry->shared_name);
+}
+
+void write_note_line(FILE *note, const char *shared_name) {
+    fputs(shared_name, note);
+    fputc('\n', note);
 }

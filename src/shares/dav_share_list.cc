@@ -7,6 +7,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "base/appliance_paths.h"
 #include "base/safe_file.h"
 #include "base/record_list.h"
 #include "base/text_field.h"
@@ -17,9 +18,6 @@ namespace {
 
 constexpr char VOLUME_LIST[] = "lighty.xml";
 constexpr char ISO_LIST[] = "lighty_iso.xml";
-constexpr char VOLUME_LIST_TMP[] = "/tmp/lighty.xml";
-constexpr char ISO_LIST_TMP[] = "/tmp/lighty_iso.xml";
-constexpr char ISO_DIR[] = "/mnt/isoMount";
 // One more than a field, so that an overlong element text shows as such.
 constexpr size_t ITEM_TEXT_WIDTH = DAV_TEXT_WIDTH + 1;
 constexpr size_t NUMBER_TEXT_WIDTH = 64;
@@ -149,8 +147,6 @@ void write_list_body(FILE *file, const DavShareEntry *entries, const char *direc
     fputs("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n", file);
     fprintf(file, "\t\t<count>%d</count>\n\t\t<allen>%d</allen>\n", count, allen);
     for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next) {
-        memset(name, 0, sizeof name);
-        memset(path, 0, sizeof path);
         if (!item_texts(entry, directory, name, path)) continue;
         fprintf(file,
                 "\t\t\t<item>\n\t\t\t\t<shared_name>%s</shared_name>\n\t\t\t\t<path>%s</path>\n"
@@ -160,28 +156,79 @@ void write_list_body(FILE *file, const DavShareEntry *entries, const char *direc
     fputs("\t</WebDAV>\n</config>\n", file);
 }
 
-// -1 when the temporary file cannot be opened (a planted link included).
-int write_list_file(const char *tmp_path, const DavShareEntry *entries, const char *directory,
-                    int allen) {
-    FILE *file = fopen_no_follow(tmp_path, "w+");
-    if (file == nullptr) return -1;
-    write_list_body(file, entries, directory, allen);
-    fclose(file);
-    return 0;
+bool is_well_formed(const MemoryFile &text) {
+    quiet_xml_errors();
+    xmlDoc *doc = xmlReadMemory(text.text, static_cast<int>(text.length), nullptr, "UTF-8",
+                                XML_PARSE_NODICT | XML_PARSE_NONET);
+    if (doc == nullptr) return false;
+    xmlFreeDoc(doc);
+    return true;
 }
 
-void store_list_file(const char *tmp_path, const char *volume_dir) {
-    saveDataToHiddenByVolume(tmp_path, volume_dir);
-    remove(tmp_path);
+// True for a list whose text came out whole and parses; the caller then
+// frees `text`.
+bool build_list(MemoryFile *text, const DavShareEntry *entries, const char *directory, int allen) {
+    if (memory_file_open(text) != 0) return false;
+    write_list_body(text->stream, entries, directory, allen);
+    if (memory_file_close(text) == 0 && is_well_formed(*text)) return true;
+    memory_file_free(text);
+    return false;
 }
 
-// The iso list is kept on every volume; the file goes whatever was found.
-void store_iso_list() {
+// A stored list the parser rejects is kept byte for byte: its entries were
+// left out of this run, and writing would lose them for good.
+bool stored_list_unreadable(const char *list_name, const char *volume_dir) {
+    char *location = getDataLocationByVolume(list_name, volume_dir);
+    if (location == nullptr) return true;
+    struct stat status;
+    bool unreadable = false;
+    if (lstat(location, &status) == 0) {
+        xmlDoc *doc = parse_list_file(location);
+        unreadable = doc == nullptr;
+        xmlFreeDoc(doc);
+    }
+    free(location);
+    return unreadable;
+}
+
+// The lists go to the volume library as files named like the stored ones;
+// they are written in a folder only this run can write to.
+struct ListStaging {
+    char dir[32];
+    char file[64];
+};
+
+bool stage_list(ListStaging *staging, const char *list_name, const MemoryFile &text) {
+    copy_text(staging->dir, "/tmp/davsync.XXXXXX");
+    staging->file[0] = '\0';
+    if (mkdtemp(staging->dir) == nullptr) return false;
+    if (format_text_field(staging->file, sizeof staging->file, "%s/%s", staging->dir,
+                          list_name) == 0 &&
+        replace_file(staging->file, text.text, text.length, 0644) == 0)
+        return true;
+    rmdir(staging->dir);
+    return false;
+}
+
+void unstage_list(ListStaging *staging) {
+    unlink(staging->file);
+    rmdir(staging->dir);
+}
+
+void store_list(const char *list_name, const MemoryFile &text, const char *volume_dir) {
+    if (stored_list_unreadable(list_name, volume_dir)) return;
+    ListStaging staging;
+    if (!stage_list(&staging, list_name, text)) return;
+    saveDataToHiddenByVolume(staging.file, volume_dir);
+    unstage_list(&staging);
+}
+
+// The iso list is kept on every volume.
+void store_iso_list(const MemoryFile &text) {
     VolumeEntry *volumes = scan_volume_table();
     for (VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next)
-        if (volume->mount_dir[0] != '\0') saveDataToHiddenByVolume(ISO_LIST_TMP, volume->mount_dir);
+        if (volume->mount_dir[0] != '\0') store_list(ISO_LIST, text, volume->mount_dir);
     free_volume_list(volumes);
-    remove(ISO_LIST_TMP);
 }
 
 }  // namespace
@@ -262,14 +309,13 @@ void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directo
     for (const PathNode *node = directories; node != nullptr; node = node->next) {
         const char *directory = node->path;
         if (directory[0] == '\0') continue;
-        bool iso = strncmp(directory, ISO_DIR, VOLUME_PREFIX_LENGTH) == 0;
-        if (write_list_file(iso ? ISO_LIST_TMP : VOLUME_LIST_TMP, entries, directory, allen) != 0)
-            continue;
-        if (iso) {
-            store_iso_list();
-        } else if (access(directory, F_OK) == 0) {
-            store_list_file(VOLUME_LIST_TMP, directory);
-        }
+        MemoryFile text;
+        if (!build_list(&text, entries, directory, allen)) continue;
+        if (strncmp(directory, ISO_DIR, VOLUME_PREFIX_LENGTH) == 0)
+            store_iso_list(text);
+        else if (access(directory, F_OK) == 0)
+            store_list(VOLUME_LIST, text, directory);
+        memory_file_free(&text);
     }
 }
 
@@ -277,8 +323,10 @@ void write_volume_share_lists(const DavShareEntry *entries, int allen) {
     VolumeEntry *volumes = scan_volume_table();
     for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
         if (volume->mount_dir[0] == '\0') continue;
-        if (write_list_file(VOLUME_LIST_TMP, entries, volume->mount_dir, allen) != 0) continue;
-        store_list_file(VOLUME_LIST_TMP, volume->mount_dir);
+        MemoryFile text;
+        if (!build_list(&text, entries, volume->mount_dir, allen)) continue;
+        store_list(VOLUME_LIST, text, volume->mount_dir);
+        memory_file_free(&text);
     }
     free_volume_list(volumes);
 }

@@ -3,6 +3,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "base/appliance_paths.h"
 #include "base/record_list.h"
 #include "base/text_field.h"
 
@@ -23,4 +24,10 @@ int path_list_add(const char *text, PathNode *head) {
     copy_text(added->path, text);
     tail->next = added;
     return 0;
+}
+
+void add_volume_prefix(const char *path, PathNode *volume_dirs) {
+    char prefix[PATH_NODE_WIDTH];
+    copy_text_prefix(prefix, sizeof prefix, path, VOLUME_PREFIX_LENGTH);
+    path_list_add(prefix, volume_dirs);
 }

@@ -18,5 +18,8 @@ PathNode *new_path_node();
 // a node, or memory exhausted, gives -1.
 int path_list_add(const char *text, PathNode *head);
 void free_path_list(PathNode *head);
+// Adds the volume prefix of `path` (its first 13 characters, the volume
+// directory whose list holds it) to the list of directories to rewrite.
+void add_volume_prefix(const char *path, PathNode *volume_dirs);
 
 #endif

@@ -59,7 +59,7 @@ void store_field(ShareRecord *record, const CatalogueField &field, char *scratch
     }
     // Replaced before the cut, so a shortened value loses as little as possible.
     if (field.kind == FieldKind::recovered_text) recover_special_char(scratch);
-    store_text_field(target, field.width, scratch);
+    copy_text_field(target, field.width, scratch);
 }
 
 // Records are large and mostly empty: only the bytes that hold a value are

@@ -4,8 +4,9 @@
 #ifndef DAVSYNC_SHARES_VOLUME_TABLE_H
 #define DAVSYNC_SHARES_VOLUME_TABLE_H
 
+#include "base/appliance_paths.h"
+
 constexpr int MOUNT_DIR_WIDTH = 32;
-constexpr int VOLUME_PREFIX_LENGTH = 13;  // "/mnt/HD/HD_a2", "/mnt/isoMount"
 
 struct VolumeEntry {
     char mount_dir[MOUNT_DIR_WIDTH];

@@ -135,8 +135,9 @@ TEST_F(ConfFile, CommandLinesCarryNoDataTheShellWouldRun) {
                              "evil2"})
         EXPECT_THAT(conf, HasSubstr(section(name, "On", OPEN))) << name;
     EXPECT_THAT(conf, Not(HasSubstr("x\\;touch")));
-    // Escaping alone makes this one harmless, so it is linked.
-    EXPECT_THAT(box.list_dir(LINKS), ElementsAre(neutralised));
+    // Links are made without a shell, so only names with a '/' get none.
+    EXPECT_THAT(box.list_dir(LINKS), ElementsAre("Q", "evil2", neutralised));
+    EXPECT_EQ(box.link_target(LINKS + "/Q"), "/mnt/HD/HD_a2/q|/tmp/payload.sh");
     EXPECT_EQ(box.link_target(LINKS + "/" + neutralised), "/mnt/HD/HD_a2/x4");
 }
 
@@ -148,18 +149,18 @@ TEST_F(ConfFile, NamesThatWouldBreakTheConfigurationGetOnlyANoteLine) {
     EXPECT_EQ(box.read_file(NOTE), "say \"hi\"\nback\\slash\nnew\nline\ncaf\xc3\xa9 & #1\n");
 }
 
-TEST_F(ConfFile, APlantedOrLeftOverConfigurationFileIsNotWritten) {
+TEST_F(ConfFile, APlantedOrLeftOverConfigurationFileIsNeverPlaced) {
     publish_on_a2({open_share("Safe", "Safe")});
+    const std::string built = HEADER + section("Safe", "On", OPEN);
     box.write_file("/etc/victim", "keep");
     box.make_symlink("/etc/victim", "/tmp/dav.conf");
-    start();
+    EXPECT_EQ(start(), built);
     EXPECT_EQ(box.read_file("/etc/victim"), "keep");
-    EXPECT_THAT(box.list_dir(LINKS), IsEmpty());
 
-    box.remove(CONF);
-    box.write_file("/tmp/dav.conf", "left over\n");
-    EXPECT_EQ(start(), "left over\n");
-    EXPECT_THAT(box.list_dir(LINKS), IsEmpty());
+    box.remove("/tmp/dav.conf");
+    box.write_file("/tmp/dav.conf", "ErrorLog \"|/bin/sh -c id\"\n");
+    EXPECT_EQ(start(), built);
+    EXPECT_THAT(box.list_dir(LINKS), ElementsAre("Safe"));
 }
 
 }  // namespace

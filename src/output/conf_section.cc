@@ -1,41 +1,12 @@
-#include "output/conf_writer.h"
+#include "output/conf_section.h"
 
 #include <cstring>
-#include <sys/file.h>
-#include <sys/stat.h>
 
 #include "access/user_list.h"
-#include "base/safe_file.h"
+#include "base/appliance_paths.h"
 #include "base/text_field.h"
 
 static const int USER_PIECE_WIDTH = 128;
-static const int NOTE_LINE_WIDTH = 1024;
-
-FILE *open_locked(const char *path, const char *mode) {
-    FILE *file = fopen_no_follow(path, mode);
-    if (file == nullptr) return nullptr;
-    if (flock(fileno(file), LOCK_EX) != 0) {
-        fclose(file);
-        return nullptr;
-    }
-    return file;
-}
-
-void close_locked(FILE *file) {
-    fflush(file);
-    flock(fileno(file), LOCK_UN);
-    fclose(file);
-}
-
-bool path_exists(const char *path) {
-    struct stat status;
-    return lstat(path, &status) == 0;
-}
-
-bool is_link_name(const char *shared_name) {
-    return shared_name[0] != '\0' && strchr(shared_name, '/') == nullptr &&
-           strcmp(shared_name, ".") != 0 && strcmp(shared_name, "..") != 0;
-}
 
 bool is_conf_safe_name(const char *shared_name) {
     for (const char *c = shared_name; *c != '\0'; ++c) {
@@ -58,22 +29,16 @@ static NameNode *expand_field(const char *list_text) {
     return names;
 }
 
-static bool holds_name(const NameNode *list, const char *name) {
-    for (const NameNode *node = list; node != nullptr; node = node->next)
-        if (strcmp(node->name, name) == 0) return true;
-    return false;
-}
-
 static void remove_invalid(NameNode *names, const NameNode *invalid) {
     for (NameNode *node = names; node != nullptr; node = node->next)
-        if (node->name[0] != '\0' && holds_name(invalid, node->name))
+        if (node->name[0] != '\0' && name_list_holds(invalid, node->name))
             memset(node->name, 0, sizeof node->name);
 }
 
 // Each name is followed by one space; names that no longer fit are left
 // off, the line stops at the last one that does.
 static void write_user_line(FILE *conf, const NameNode *first, const NameNode *second) {
-    char line[CONF_LINE_WIDTH];
+    char line[LINE_BUFFER_WIDTH];
     copy_text(line, "\t\tRequire user ");
     const NameNode *lists[] = {first, second};
     bool full = false;
@@ -119,7 +84,7 @@ static void write_authenticated_block(FILE *conf, const ShareRecord *rules) {
 
 void write_share_section(FILE *conf, const char *shared_name, bool dav_on,
                          const ShareRecord *rules) {
-    char line[CONF_LINE_WIDTH];
+    char line[LINE_BUFFER_WIDTH];
     format_text_field(line, sizeof line, "Alias \"/%s\" \"/usr/local/apache2_dav/webdav/%s\"\n",
                       shared_name, shared_name);
     fputs(line, conf);
@@ -139,10 +104,4 @@ void write_share_section(FILE *conf, const char *shared_name, bool dav_on,
     fputs("</Directory>\n"
           "\n",
           conf);
-}
-
-void write_note_line(FILE *note, const char *shared_name) {
-    char line[NOTE_LINE_WIDTH];
-    format_text_field(line, sizeof line, "%s\n", shared_name);
-    fputs(line, note);
 }

@@ -1,0 +1,21 @@
+// One share's section of the server configuration: the Alias line and the
+// Directory block with its Dav switch and access rules. Entry shares and
+// USB volumes get the very same sections.
+#ifndef DAVSYNC_OUTPUT_CONF_SECTION_H
+#define DAVSYNC_OUTPUT_CONF_SECTION_H
+
+#include <cstdio>
+
+#include "shares/share_catalogue.h"
+
+// A shared name stands in double quotes in the configuration: one with a
+// double quote, a backslash or a control byte would break it.
+bool is_conf_safe_name(const char *shared_name);
+// Rows Alias to the blank line after </Directory>. `rules` null gives the
+// open access block; otherwise the block follows the share's lists: open
+// when a list names allaccount, public holds "yes" or web_public is 1, else
+// authenticated with the readers and writers less the invalid users.
+void write_share_section(FILE *conf, const char *shared_name, bool dav_on,
+                         const ShareRecord *rules);
+
+#endif
