@@ -49,11 +49,14 @@ static void release_node_lock(CycleRun *run) {
 
 static void free_run_objects(CycleRun *run) {
     free_dav_share_list(run->entries);
+    share_lookup_free(&run->shares);
     free_share_catalogue(run->catalogue);
     free_path_list(run->volume_dirs);
+    free_path_list(run->unreadable);
     run->entries = nullptr;
     run->catalogue = nullptr;
     run->volume_dirs = nullptr;
+    run->unreadable = nullptr;
 }
 
 int cycle_abort(CycleRun *run) {
@@ -68,24 +71,26 @@ int cycle_begin(CycleRun *run, const CycleVariant &variant, int node_lock) {
     run->variant = variant;
     if (variant.wait_start_lock) start_lock_wait_and_mark();
     run->volume_dirs = new_path_node();
+    run->unreadable = new_path_node();
     run->node_lock = variant.lock_taken_first ? node_lock : lock_node_file();
     run->lock_taken = true;
-    if (run->volume_dirs == nullptr) return cycle_abort(run);
+    if (run->volume_dirs == nullptr || run->unreadable == nullptr) return cycle_abort(run);
 
     run->entries = new_dav_share_entry();
     int allen_unused = 0;
-    if (run->entries == nullptr || load_dav_share_lists(run->entries, &allen_unused) < 0)
+    if (run->entries == nullptr ||
+        load_dav_share_lists_noting(run->entries, &allen_unused, run->unreadable) < 0)
         return cycle_abort(run);
     run->webdav_enable = variant.read_enable_flag ? read_webdav_enable_flag() : 0;
     return 0;
 }
 
-static void reconcile_entries(DavShareEntry *entries, const ShareRecord *catalogue,
+static void reconcile_entries(DavShareEntry *entries, const ShareLookup *catalogue,
                               ReconcileRule rule) {
     for (DavShareEntry *entry = entries; entry != nullptr; entry = entry->next) {
         if (entry->path[0] == '\0') continue;
         const ShareRecord *share =
-            find_entry_share(entry, catalogue, rule == RECONCILE_NAME_AND_PATH);
+            find_entry_share(catalogue, entry, rule == RECONCILE_NAME_AND_PATH);
         if (share == nullptr) {
             memset(entry->shared_name, 0, sizeof entry->shared_name);
             memset(entry->path, 0, sizeof entry->path);
@@ -117,7 +122,7 @@ static void write_share_lists(CycleRun *run) {
     int allen = allen_value(run);
     switch (run->variant.writer) {
     case WRITE_ALL_VOLUMES:
-        write_volume_share_lists(run->entries, allen);
+        write_volume_share_lists(run->entries, allen, run->unreadable);
         return;
     case WRITE_FIXED_DIRECTORIES:
         add_fixed_volume_dirs(run->volume_dirs);
@@ -125,14 +130,14 @@ static void write_share_lists(CycleRun *run) {
     case WRITE_CHOSEN_DIRECTORIES:
         break;
     }
-    write_dav_share_lists(run->entries, run->volume_dirs, allen);
+    write_dav_share_lists(run->entries, run->volume_dirs, allen, run->unreadable);
 }
 
 // Configuration, note file, USB sections and links, built whole, then placed.
 static void build_and_place_conf(const CycleRun *run) {
     ConfBuild build;
     if (conf_build_open(&build) != 0) return;
-    write_dav_conf(&build, run->webdav_enable, run->entries, run->catalogue);
+    write_dav_conf(&build, run->webdav_enable, run->entries, &run->shares);
     if (!config_switch_on("/system_mgr/samba/ads_enable")) write_webdav_note(&build, run->entries);
     append_usb_shares(&build);
     conf_build_place(&build);
@@ -142,9 +147,11 @@ static void build_and_place_conf(const CycleRun *run) {
 int cycle_finish(CycleRun *run) {
     run->catalogue = new_share_record();
     if (run->catalogue == nullptr) return cycle_abort(run);
-    if (read_share_catalogue(run->catalogue) < 0) return cycle_abort(run);
+    if (read_share_catalogue(run->catalogue) < 0 ||
+        share_lookup_build(&run->shares, run->catalogue) != 0)
+        return cycle_abort(run);
 
-    reconcile_entries(run->entries, run->catalogue, run->variant.rule);
+    reconcile_entries(run->entries, &run->shares, run->variant.rule);
     write_share_lists(run);
     build_and_place_conf(run);
 

@@ -15,6 +15,7 @@
 #include "shares/dav_share_list.h"
 #include "shares/path_list.h"
 #include "shares/share_catalogue.h"
+#include "shares/share_lookup.h"
 
 enum ReconcileRule {
     RECONCILE_PATH,           // an entry takes the name of the first share below its path
@@ -51,7 +52,9 @@ struct CycleRun {
     bool lock_taken;  // node_lock still to be released
     DavShareEntry *entries;
     ShareRecord *catalogue;
+    ShareLookup shares;       // the catalogue by path
     PathNode *volume_dirs;
+    PathNode *unreadable;     // stored lists to keep as they are
     int webdav_enable;
 };
 

@@ -6,6 +6,8 @@
 #ifndef DAVSYNC_OUTPUT_CONF_BUILD_H
 #define DAVSYNC_OUTPUT_CONF_BUILD_H
 
+#include "access/user_list.h"
+#include "base/name_index.h"
 #include "base/safe_file.h"
 #include "output/link_dir.h"
 #include "shares/path_list.h"
@@ -15,11 +17,17 @@ struct ConfBuild {
     MemoryFile note;
     bool note_wanted;     // false: the note file is removed when placed
     PathNode *published;  // shared names that have a section already
+    PathNode *published_tail;
+    NameIndex published_names;  // over the texts of `published`
     LinkRequest *links;
+    GroupTable groups;
 };
 
 // 0, or -1 when memory runs out (the build is then freed).
 [[nodiscard]] int conf_build_open(ConfBuild *build);
+// Registers a shared name for a section: 0 when it was not published yet,
+// -1 when it was (or does not fit a path list node, or memory runs out).
+int publish_name(ConfBuild *build, const char *shared_name);
 // Writes the configuration beside its place, brings the link directory in
 // line, writes or removes the note file, then renames the configuration
 // into place. -1 when the build or the configuration's writing failed:

@@ -6,8 +6,6 @@
 #include "base/appliance_paths.h"
 #include "base/text_field.h"
 
-static const int USER_PIECE_WIDTH = 128;
-
 bool is_conf_safe_name(const char *shared_name) {
     for (const char *c = shared_name; *c != '\0'; ++c) {
         unsigned char byte = static_cast<unsigned char>(*c);
@@ -23,43 +21,56 @@ static bool is_open_share(const ShareRecord *rules) {
            strstr(rules->public_, "yes") != nullptr || rules->web_public == 1;
 }
 
-static NameNode *expand_field(const char *list_text) {
+static NameNode *expand_field(GroupTable *groups, const char *list_text) {
     NameNode *names = nullptr;
-    if (list_text[0] != '\0') expand_user_list(list_text, &names);
+    if (list_text[0] != '\0') expand_user_list_with(groups, list_text, &names);
     return names;
 }
 
-static void remove_invalid(NameNode *names, const NameNode *invalid) {
+static void remove_invalid(NameNode *names, const NameIndex *invalid) {
     for (NameNode *node = names; node != nullptr; node = node->next)
-        if (node->name[0] != '\0' && name_list_holds(invalid, node->name))
+        if (node->name[0] != '\0' && name_index_find(invalid, node->name) != nullptr)
             memset(node->name, 0, sizeof node->name);
 }
 
-// Each name is followed by one space; names that no longer fit are left
-// off, the line stops at the last one that does.
-static void write_user_line(FILE *conf, const NameNode *first, const NameNode *second) {
-    char line[LINE_BUFFER_WIDTH];
-    copy_text(line, "\t\tRequire user ");
-    const NameNode *lists[] = {first, second};
-    bool full = false;
-    for (const NameNode *list : lists) {
-        for (const NameNode *node = list; node != nullptr && !full; node = node->next) {
-            if (node->name[0] == '\0') continue;
-            char piece[USER_PIECE_WIDTH];
-            format_text_field(piece, sizeof piece, "%s ", node->name);
-            full = append_text(line, piece) < 0;
-        }
-    }
-    fputs(line, conf);
-    fputs("\n", conf);
+static void index_names(NameIndex *index, NameNode *names) {
+    for (NameNode *node = names; node != nullptr; node = node->next)
+        if (node->name[0] != '\0') (void)name_index_add(index, node->name, node);
 }
 
-static void write_authenticated_block(FILE *conf, const ShareRecord *rules) {
-    NameNode *invalid = expand_field(rules->invalid_users);
-    NameNode *readers = expand_field(rules->read_list);
-    NameNode *writers = expand_field(rules->write_list);
-    remove_invalid(readers, invalid);
-    remove_invalid(writers, invalid);
+// A user line has the width of a line buffer. Each name is followed by one
+// space; names that no longer fit are left off, the line stops at the last
+// one that does.
+static void write_user_line(FILE *conf, const NameNode *first, const NameNode *second) {
+    static const char START[] = "\t\tRequire user ";
+    fputs(START, conf);
+    size_t used = sizeof START - 1;
+    const NameNode *lists[] = {first, second};
+    for (const NameNode *list : lists) {
+        for (const NameNode *node = list; node != nullptr; node = node->next) {
+            if (node->name[0] == '\0') continue;
+            size_t piece = strlen(node->name) + 1;
+            if (used + piece > LINE_BUFFER_WIDTH - 1) {
+                fputc('\n', conf);
+                return;
+            }
+            fputs(node->name, conf);
+            fputc(' ', conf);
+            used += piece;
+        }
+    }
+    fputc('\n', conf);
+}
+
+static void write_authenticated_block(FILE *conf, GroupTable *groups, const ShareRecord *rules) {
+    NameNode *invalid = expand_field(groups, rules->invalid_users);
+    NameNode *readers = expand_field(groups, rules->read_list);
+    NameNode *writers = expand_field(groups, rules->write_list);
+    NameIndex invalid_names = {};
+    index_names(&invalid_names, invalid);
+    remove_invalid(readers, &invalid_names);
+    remove_invalid(writers, &invalid_names);
+    name_index_free(&invalid_names);
 
     fputs("\tAuthType Basic\n"
           "\tAuthName DAV-upload\n"
@@ -82,7 +93,7 @@ static void write_authenticated_block(FILE *conf, const ShareRecord *rules) {
     free_name_list(writers);
 }
 
-void write_share_section(FILE *conf, const char *shared_name, bool dav_on,
+void write_share_section(FILE *conf, GroupTable *groups, const char *shared_name, bool dav_on,
                          const ShareRecord *rules) {
     char line[LINE_BUFFER_WIDTH];
     format_text_field(line, sizeof line, "Alias \"/%s\" \"/usr/local/apache2_dav/webdav/%s\"\n",
@@ -100,7 +111,7 @@ void write_share_section(FILE *conf, const char *shared_name, bool dav_on,
     if (rules == nullptr || is_open_share(rules))
         fputs("\tAuthType None\n", conf);
     else
-        write_authenticated_block(conf, rules);
+        write_authenticated_block(conf, groups, rules);
     fputs("</Directory>\n"
           "\n",
           conf);

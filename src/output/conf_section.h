@@ -6,6 +6,7 @@
 
 #include <cstdio>
 
+#include "access/user_list.h"
 #include "shares/share_catalogue.h"
 
 // A shared name stands in double quotes in the configuration: one with a
@@ -15,7 +16,8 @@ bool is_conf_safe_name(const char *shared_name);
 // open access block; otherwise the block follows the share's lists: open
 // when a list names allaccount, public holds "yes" or web_public is 1, else
 // authenticated with the readers and writers less the invalid users.
-void write_share_section(FILE *conf, const char *shared_name, bool dav_on,
+// Groups come from `groups`.
+void write_share_section(FILE *conf, GroupTable *groups, const char *shared_name, bool dav_on,
                          const ShareRecord *rules);
 
 #endif

@@ -17,13 +17,13 @@ static void write_header(FILE *conf) {
 }
 
 static void write_entry(ConfBuild *build, int webdav_enable, const DavShareEntry *entry,
-                        const ShareRecord *catalogue) {
+                        const ShareLookup *catalogue) {
     if (entry->path[0] == '\0' || !is_conf_safe_name(entry->shared_name)) return;
     // Registered even when no share matches, so USB volumes cannot take it.
-    if (path_list_add(entry->shared_name, build->published) < 0) return;
-    const ShareRecord *share = find_entry_share(entry, catalogue, true);
+    if (publish_name(build, entry->shared_name) < 0) return;
+    const ShareRecord *share = find_entry_share(catalogue, entry, true);
     if (share == nullptr) return;
-    write_share_section(build->conf.stream, entry->shared_name,
+    write_share_section(build->conf.stream, &build->groups, entry->shared_name,
                         webdav_enable != 0 && entry->enable != 0, share);
     // The link points at the entry's own path, not the share's.
     if ((webdav_enable & entry->enable) != 0)
@@ -31,7 +31,7 @@ static void write_entry(ConfBuild *build, int webdav_enable, const DavShareEntry
 }
 
 void write_dav_conf(ConfBuild *build, int webdav_enable, const DavShareEntry *entries,
-                    const ShareRecord *catalogue) {
+                    const ShareLookup *catalogue) {
     write_header(build->conf.stream);
     for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next)
         write_entry(build, webdav_enable, entry, catalogue);

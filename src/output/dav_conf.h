@@ -7,12 +7,12 @@
 
 #include "output/conf_build.h"
 #include "shares/dav_share_list.h"
-#include "shares/share_catalogue.h"
+#include "shares/share_lookup.h"
 
 // Writes into build->conf. An entry is taken when its path is not empty, its
 // name is safe in the file and not yet in build->published (it is added
 // there), and a catalogue share matches its name and path.
 void write_dav_conf(ConfBuild *build, int webdav_enable, const DavShareEntry *entries,
-                    const ShareRecord *catalogue);
+                    const ShareLookup *catalogue);
 
 #endif

@@ -9,6 +9,7 @@
 #include <unistd.h>
 
 #include "base/appliance_paths.h"
+#include "base/name_index.h"
 #include "base/record_list.h"
 #include "base/text_field.h"
 
@@ -31,11 +32,6 @@ void request_link(LinkRequest **list, const char *name, const char *target) {
 
 void free_link_requests(LinkRequest *list) { free_record_list(list); }
 
-static const LinkRequest *find_request(const LinkRequest *wanted, const char *name) {
-    for (; wanted != nullptr; wanted = wanted->next)
-        if (strcmp(wanted->name, name) == 0) return wanted;
-    return nullptr;
-}
 
 static bool points_at(int dir_fd, const char *name, const char *target) {
     char held[PATH_NODE_WIDTH + 1];
@@ -47,20 +43,28 @@ static bool points_at(int dir_fd, const char *name, const char *target) {
 // What "rm DIR/*" removes: visible entries that are not folders. A link
 // that is already right stays, so a share does not vanish mid-run.
 static void remove_stale_entries(int dir_fd, const LinkRequest *wanted) {
+    NameIndex by_name = {};
+    for (const LinkRequest *request = wanted; request != nullptr; request = request->next)
+        (void)name_index_add(&by_name, request->name, const_cast<LinkRequest *>(request));
     DIR *listing = fdopendir(dup(dir_fd));
-    if (listing == nullptr) return;
+    if (listing == nullptr) {
+        name_index_free(&by_name);
+        return;
+    }
     while (const struct dirent *entry = readdir(listing)) {
         if (entry->d_name[0] == '.') continue;
         struct stat status;
         if (fstatat(dir_fd, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0) continue;
         if (S_ISDIR(status.st_mode)) continue;
-        const LinkRequest *request = find_request(wanted, entry->d_name);
+        const LinkRequest *request =
+            static_cast<const LinkRequest *>(name_index_find(&by_name, entry->d_name));
         if (S_ISLNK(status.st_mode) && request != nullptr &&
             points_at(dir_fd, entry->d_name, request->target))
             continue;
         unlinkat(dir_fd, entry->d_name, 0);
     }
     closedir(listing);
+    name_index_free(&by_name);
 }
 
 // mkdir -p: every missing folder on the way, 0755.

@@ -94,16 +94,16 @@ static void find_shared_name(const char *volume, char (&name)[SHARED_NAME_WIDTH]
     lookup_shared_name(usb_folder_name(volume), name);
 }
 
-static void write_volume_section(FILE *conf, const char *volume, const char *shared_name) {
+static void write_volume_section(ConfBuild *build, const char *volume, const char *shared_name) {
     char catalogue_path[FILE_LINE_WIDTH];
     if (!volume_file_path(volume, ".smbm.xml", catalogue_path) || !has_file(volume, ".smbm.xml")) {
-        write_share_section(conf, shared_name, true, nullptr);
+        write_share_section(build->conf.stream, &build->groups, shared_name, true, nullptr);
         return;
     }
     ShareRecord *rules = new_share_record();
     if (rules == nullptr) return;
     read_share_catalogue_file(rules, catalogue_path);
-    write_share_section(conf, shared_name, true, rules);
+    write_share_section(build->conf.stream, &build->groups, shared_name, true, rules);
     free_share_catalogue(rules);
 }
 
@@ -112,8 +112,8 @@ static void append_volume(ConfBuild *build, const char *volume) {
     find_shared_name(volume, shared_name);
     // A volume whose name was not found would alias the server's root.
     if (shared_name[0] == '\0' || !is_conf_safe_name(shared_name)) return;
-    if (path_list_add(shared_name, build->published) < 0) return;
-    write_volume_section(build->conf.stream, volume, shared_name);
+    if (publish_name(build, shared_name) < 0) return;
+    write_volume_section(build, volume, shared_name);
     request_link(&build->links, shared_name, volume);
 }
 

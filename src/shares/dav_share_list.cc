@@ -124,12 +124,12 @@ VolumeEntry *scan_volume_table() {
 // Whether `entry` is written to the list of `directory`; if so its escaped
 // name and its escaped path less the volume prefix. Texts that do not escape
 // within the buffer are left out rather than written cut.
-bool item_texts(const DavShareEntry *entry, const char *directory, char *name_out,
-                char *path_out) {
-    if (strncmp(entry->path, directory, strlen(directory)) != 0) return false;
+bool item_texts(const DavShareEntry *entry, const char *directory, size_t directory_length,
+                char *name_out, char *path_out) {
+    if (strncmp(entry->path, directory, directory_length) != 0) return false;
     struct stat status;
     if (stat(entry->path, &status) != 0) return false;
-    char path[XML_ESCAPE_WIDTH] = {};
+    char path[XML_ESCAPE_WIDTH];
     if (escape_xml_text(entry->shared_name, name_out) != 0) return false;
     if (escape_xml_text(entry->path, path) != 0) return false;
     size_t length = strlen(path);
@@ -138,22 +138,30 @@ bool item_texts(const DavShareEntry *entry, const char *directory, char *name_ou
     return true;
 }
 
-void write_list_body(FILE *file, const DavShareEntry *entries, const char *directory, int allen) {
+// The items go to their own stream first: the count stands before them.
+// -1 when memory ran out.
+int write_list_body(FILE *file, const DavShareEntry *entries, const char *directory, int allen) {
+    MemoryFile items;
+    if (memory_file_open(&items) != 0) return -1;
+    size_t directory_length = strlen(directory);
     char name[XML_ESCAPE_WIDTH];
     char path[XML_ESCAPE_WIDTH];
     int count = 0;
-    for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next)
-        if (item_texts(entry, directory, name, path)) ++count;
-    fputs("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n", file);
-    fprintf(file, "\t\t<count>%d</count>\n\t\t<allen>%d</allen>\n", count, allen);
     for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next) {
-        if (!item_texts(entry, directory, name, path)) continue;
-        fprintf(file,
+        if (!item_texts(entry, directory, directory_length, name, path)) continue;
+        ++count;
+        fprintf(items.stream,
                 "\t\t\t<item>\n\t\t\t\t<shared_name>%s</shared_name>\n\t\t\t\t<path>%s</path>\n"
                 "\t\t\t\t<RW>%d</RW>\n\t\t\t\t<enable>%d</enable>\n\t\t\t</item>\n",
                 name, path, entry->RW, entry->enable);
     }
+    int result = memory_file_close(&items);
+    fputs("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n", file);
+    fprintf(file, "\t\t<count>%d</count>\n\t\t<allen>%d</allen>\n", count, allen);
+    fwrite(items.text, 1, items.length, file);
     fputs("\t</WebDAV>\n</config>\n", file);
+    memory_file_free(&items);
+    return result;
 }
 
 bool is_well_formed(const MemoryFile &text) {
@@ -169,26 +177,22 @@ bool is_well_formed(const MemoryFile &text) {
 // frees `text`.
 bool build_list(MemoryFile *text, const DavShareEntry *entries, const char *directory, int allen) {
     if (memory_file_open(text) != 0) return false;
-    write_list_body(text->stream, entries, directory, allen);
-    if (memory_file_close(text) == 0 && is_well_formed(*text)) return true;
+    int body = write_list_body(text->stream, entries, directory, allen);
+    if (memory_file_close(text) == 0 && body == 0 && is_well_formed(*text)) return true;
     memory_file_free(text);
     return false;
 }
 
-// A stored list the parser rejects is kept byte for byte: its entries were
-// left out of this run, and writing would lose them for good.
-bool stored_list_unreadable(const char *list_name, const char *volume_dir) {
+// A stored list the parser rejected when it was loaded is kept byte for
+// byte: its entries were left out of this run, and writing would lose them.
+bool is_kept(const char *list_name, const char *volume_dir, const PathNode *unreadable) {
     char *location = getDataLocationByVolume(list_name, volume_dir);
     if (location == nullptr) return true;
-    struct stat status;
-    bool unreadable = false;
-    if (lstat(location, &status) == 0) {
-        xmlDoc *doc = parse_list_file(location);
-        unreadable = doc == nullptr;
-        xmlFreeDoc(doc);
-    }
+    bool kept = false;
+    for (const PathNode *node = unreadable; node != nullptr && !kept; node = node->next)
+        kept = node->path[0] != '\0' && strcmp(node->path, location) == 0;
     free(location);
-    return unreadable;
+    return kept;
 }
 
 // The lists go to the volume library as files named like the stored ones;
@@ -215,8 +219,9 @@ void unstage_list(ListStaging *staging) {
     rmdir(staging->dir);
 }
 
-void store_list(const char *list_name, const MemoryFile &text, const char *volume_dir) {
-    if (stored_list_unreadable(list_name, volume_dir)) return;
+void store_list(const char *list_name, const MemoryFile &text, const char *volume_dir,
+                const PathNode *unreadable) {
+    if (is_kept(list_name, volume_dir, unreadable)) return;
     ListStaging staging;
     if (!stage_list(&staging, list_name, text)) return;
     saveDataToHiddenByVolume(staging.file, volume_dir);
@@ -224,10 +229,10 @@ void store_list(const char *list_name, const MemoryFile &text, const char *volum
 }
 
 // The iso list is kept on every volume.
-void store_iso_list(const MemoryFile &text) {
+void store_iso_list(const MemoryFile &text, const PathNode *unreadable) {
     VolumeEntry *volumes = scan_volume_table();
     for (VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next)
-        if (volume->mount_dir[0] != '\0') store_list(ISO_LIST, text, volume->mount_dir);
+        if (volume->mount_dir[0] != '\0') store_list(ISO_LIST, text, volume->mount_dir, unreadable);
     free_volume_list(volumes);
 }
 
@@ -239,6 +244,11 @@ void free_dav_share_list(DavShareEntry *head) { free_record_list(head); }
 
 int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
                            const char *list_name, int *allen_out) {
+    return read_volume_share_list_noting(entry, volume, list_name, allen_out, nullptr);
+}
+
+int read_volume_share_list_noting(DavShareEntry *entry, const VolumeEntry *volume,
+                                  const char *list_name, int *allen_out, PathNode *unreadable) {
     if (entry == nullptr) return -1;
     entry->next = nullptr;
     if (volume == nullptr || list_name == nullptr || allen_out == nullptr) return -1;
@@ -249,6 +259,7 @@ int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
         return -1;
     }
     xmlDoc *doc = parse_list_file(location);
+    if (doc == nullptr) path_list_add(location, unreadable);
     free(location);
     if (doc == nullptr) return -1;
     int result = read_counted_list(doc, entry, prefix, allen_out);
@@ -257,6 +268,10 @@ int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
 }
 
 int load_dav_share_lists(DavShareEntry *head, int *allen_out) {
+    return load_dav_share_lists_noting(head, allen_out, nullptr);
+}
+
+int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *unreadable) {
     VolumeEntry *volumes = scan_volume_table();
     if (volumes == nullptr) return -1;
 
@@ -265,7 +280,7 @@ int load_dav_share_lists(DavShareEntry *head, int *allen_out) {
     for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
         if (volume->mount_dir[0] == '\0') continue;
         if (target == nullptr) target = new_dav_share_entry();
-        int read = read_volume_share_list(target, volume, VOLUME_LIST, &allen);
+        int read = read_volume_share_list_noting(target, volume, VOLUME_LIST, &allen, unreadable);
         *allen_out = allen;
         if (read == 0) {
             if (target != head) append_list(head, target);
@@ -277,17 +292,26 @@ int load_dav_share_lists(DavShareEntry *head, int *allen_out) {
     if (target != head) free_dav_share_list(target);
 
     // Only the first readable iso list counts; the head never takes from it.
+    // Copies that do not parse are kept only when none could be read: else
+    // their entries are all in the list read.
     target = nullptr;
-    for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
+    PathNode *unreadable_iso = new_path_node();
+    bool iso_read = false;
+    for (const VolumeEntry *volume = volumes; volume != nullptr && !iso_read; volume = volume->next) {
         if (volume->mount_dir[0] == '\0') continue;
         if (target == nullptr) target = new_dav_share_entry();
-        if (read_volume_share_list(target, volume, ISO_LIST, allen_out) == 0) {
+        iso_read = read_volume_share_list_noting(target, volume, ISO_LIST, allen_out,
+                                                 unreadable_iso) == 0;
+        if (iso_read) {
             append_list(head, target);
             target = nullptr;
-            break;
+        } else if (target != nullptr) {
+            drop_following(target);
         }
-        if (target != nullptr) drop_following(target);
     }
+    for (const PathNode *node = unreadable_iso; node != nullptr && !iso_read; node = node->next)
+        if (node->path[0] != '\0') path_list_add(node->path, unreadable);
+    free_path_list(unreadable_iso);
     free_dav_share_list(target);
     free_volume_list(volumes);
     return 0;
@@ -305,27 +329,29 @@ int read_share_list_file(DavShareEntry *head, const char *file_path) {
     return result;
 }
 
-void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen) {
+void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen,
+                           const PathNode *unreadable) {
     for (const PathNode *node = directories; node != nullptr; node = node->next) {
         const char *directory = node->path;
         if (directory[0] == '\0') continue;
         MemoryFile text;
         if (!build_list(&text, entries, directory, allen)) continue;
         if (strncmp(directory, ISO_DIR, VOLUME_PREFIX_LENGTH) == 0)
-            store_iso_list(text);
+            store_iso_list(text, unreadable);
         else if (access(directory, F_OK) == 0)
-            store_list(VOLUME_LIST, text, directory);
+            store_list(VOLUME_LIST, text, directory, unreadable);
         memory_file_free(&text);
     }
 }
 
-void write_volume_share_lists(const DavShareEntry *entries, int allen) {
+void write_volume_share_lists(const DavShareEntry *entries, int allen,
+                              const PathNode *unreadable) {
     VolumeEntry *volumes = scan_volume_table();
     for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
         if (volume->mount_dir[0] == '\0') continue;
         MemoryFile text;
         if (!build_list(&text, entries, volume->mount_dir, allen)) continue;
-        store_list(VOLUME_LIST, text, volume->mount_dir);
+        store_list(VOLUME_LIST, text, volume->mount_dir, unreadable);
         memory_file_free(&text);
     }
     free_volume_list(volumes);
@@ -334,7 +360,8 @@ void write_volume_share_lists(const DavShareEntry *entries, int allen) {
 int escape_xml_text(const char *text, char *out) {
     if (text == nullptr || out == nullptr) return -1;
     if (strnlen(text, XML_ESCAPE_INPUT_MAX + 1) > XML_ESCAPE_INPUT_MAX) return -1;
-    char work[XML_ESCAPE_WIDTH] = {};
+    char work[XML_ESCAPE_WIDTH];
+    size_t used = 0;
     for (const char *at = text; *at != '\0'; ++at) {
         char single[2] = {*at, '\0'};
         const char *piece = *at == '&'   ? "&amp;"
@@ -342,19 +369,12 @@ int escape_xml_text(const char *text, char *out) {
                             : *at == '>' ? "&gt;"
                             : *at == '"' ? "&quot;"
                                          : single;
-        if (append_text(work, piece) != 0) return -1;
+        size_t length = strlen(piece);
+        if (used + length > sizeof work - 1) return -1;
+        memcpy(work + used, piece, length);
+        used += length;
     }
+    work[used] = '\0';
     copy_text_field(out, XML_ESCAPE_WIDTH, work);
     return 0;
-}
-
-const ShareRecord *find_entry_share(const DavShareEntry *entry, const ShareRecord *catalogue,
-                                    bool match_name) {
-    size_t path_length = strlen(entry->path);
-    for (const ShareRecord *share = catalogue; share != nullptr; share = share->next) {
-        if (strncmp(share->path, entry->path, path_length) != 0) continue;
-        if (!match_name || strncmp(entry->shared_name, share->name, strlen(share->name)) == 0)
-            return share;
-    }
-    return nullptr;
 }

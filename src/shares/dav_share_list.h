@@ -32,23 +32,29 @@ void free_dav_share_list(DavShareEntry *head);
 // memory runs out (entries read so far stay linked).
 int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
                            const char *list_name, int *allen_out);
+// The same; a list file that exists but does not parse is added (by its
+// location) to `unreadable`, unless that is null.
+int read_volume_share_list_noting(DavShareEntry *entry, const VolumeEntry *volume,
+                                  const char *list_name, int *allen_out, PathNode *unreadable);
 // All volume lists in mount-table order, then the first readable iso list,
 // into the empty `head`. 0, or -1 when no data volume is mounted. allen_out
 // gets the allen of the last file read that far (0 when none was).
 int load_dav_share_lists(DavShareEntry *head, int *allen_out);
+// The same, noting the lists whose entries could not be read: every volume
+// list that does not parse, and the iso copies that do not when none does.
+int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *unreadable);
 // The do/merge input file (full paths, count and allen ignored). 0 or -1.
 int read_share_list_file(DavShareEntry *head, const char *file_path);
 // Writes and stores the list of every directory in `directories` ("/mnt/isoMount"
 // selects the iso list, stored on every mounted volume); only entries whose
-// path lies in that directory and exists are written.
-void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen);
+// path lies in that directory and exists are written. A list is stored only
+// when its text came out whole and parses, and never over a stored list
+// named in `unreadable` (see load_dav_share_lists_noting).
+void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen,
+                           const PathNode *unreadable);
 // Writes and stores the volume list of every mounted data volume; no iso list.
-void write_volume_share_lists(const DavShareEntry *entries, int allen);
-// The catalogue share of an entry: the first whose path begins with the
-// entry's path and, with `match_name`, whose name begins the entry's shared
-// name. Null when none is.
-const ShareRecord *find_entry_share(const DavShareEntry *entry, const ShareRecord *catalogue,
-                                    bool match_name);
+void write_volume_share_lists(const DavShareEntry *entries, int allen,
+                              const PathNode *unreadable);
 // XML-escapes & < > " into `out` (XML_ESCAPE_WIDTH characters). -1 when text
 // is longer than 512 characters or the result would not fit; out unchanged.
 int escape_xml_text(const char *text, char *out);

@@ -3,6 +3,7 @@
 #include <cstddef>
 #include <cstdlib>
 #include <cstring>
+#include <iterator>
 #include <libxml/parser.h>
 #include <unistd.h>
 
@@ -19,67 +20,129 @@ enum class FieldKind { number, text, recovered_text };
 
 struct CatalogueField {
     const char *element;
-    size_t offset;
+    size_t offset;  // of the int, or of the text pointer
     size_t width;
     FieldKind kind;
 };
 
-#define CATALOGUE_FIELD(member, element, kind) \
-    { element, offsetof(ShareRecord, member), sizeof(ShareRecord::member), FieldKind::kind }
+#define NUMBER_FIELD(member) {#member, offsetof(ShareRecord, member), 0, FieldKind::number}
+#define TEXT_FIELD(member, element, width, kind) \
+    {element, offsetof(ShareRecord, member), width, FieldKind::kind}
 
 // In record order; each item is read element by element from this table.
 const CatalogueField catalogue_fields[] = {
-    CATALOGUE_FIELD(volume_raid, "volume_raid", number),
-    CATALOGUE_FIELD(hd_serial, "hd_serial", text),
-    CATALOGUE_FIELD(name, "name", recovered_text),
-    CATALOGUE_FIELD(comment, "comment", recovered_text),
-    CATALOGUE_FIELD(path, "path", recovered_text),
-    CATALOGUE_FIELD(browseable, "browseable", text),
-    CATALOGUE_FIELD(public_, "public", text),
-    CATALOGUE_FIELD(oplocks, "oplocks", text),
-    CATALOGUE_FIELD(map_archive, "map_archive", text),
-    CATALOGUE_FIELD(read_list, "read_list", text),
-    CATALOGUE_FIELD(write_list, "write_list", text),
-    CATALOGUE_FIELD(invalid_users, "invalid_users", text),
-    CATALOGUE_FIELD(recycle_enable, "recycle_enable", number),
-    CATALOGUE_FIELD(recycle_tree, "recycle_tree", number),
-    CATALOGUE_FIELD(web_public, "web_public", number),
+    NUMBER_FIELD(volume_raid),
+    TEXT_FIELD(hd_serial, "hd_serial", 512, text),
+    TEXT_FIELD(name, "name", 1024, recovered_text),
+    TEXT_FIELD(comment, "comment", 512, recovered_text),
+    TEXT_FIELD(path, "path", 4096, recovered_text),
+    TEXT_FIELD(browseable, "browseable", 8, text),
+    TEXT_FIELD(public_, "public", 8, text),
+    TEXT_FIELD(oplocks, "oplocks", 8, text),
+    TEXT_FIELD(map_archive, "map_archive", 8, text),
+    TEXT_FIELD(read_list, "read_list", ACCESS_LIST_WIDTH, text),
+    TEXT_FIELD(write_list, "write_list", ACCESS_LIST_WIDTH, text),
+    TEXT_FIELD(invalid_users, "invalid_users", ACCESS_LIST_WIDTH, text),
+    NUMBER_FIELD(recycle_enable),
+    NUMBER_FIELD(recycle_tree),
+    NUMBER_FIELD(web_public),
 };
 
-#undef CATALOGUE_FIELD
+#undef NUMBER_FIELD
+#undef TEXT_FIELD
 
 const xmlChar *xml_name(const char *name) { return reinterpret_cast<const xmlChar *>(name); }
 
-void store_field(ShareRecord *record, const CatalogueField &field, char *scratch) {
-    char *target = reinterpret_cast<char *>(record) + field.offset;
-    if (field.kind == FieldKind::number) {
-        int value = static_cast<int>(strtol(scratch, nullptr, 10));
-        memcpy(target, &value, sizeof value);
-        return;
+int &number_of(ShareRecord *record, const CatalogueField &field) {
+    return *reinterpret_cast<int *>(reinterpret_cast<char *>(record) + field.offset);
+}
+
+const char *&text_of(ShareRecord *record, const CatalogueField &field) {
+    return *reinterpret_cast<const char **>(reinterpret_cast<char *>(record) + field.offset);
+}
+
+// Texts may hold what users typed; they are cleared before the memory goes.
+void free_texts(ShareRecord *record) {
+    if (record->texts == nullptr) return;
+    size_t used = 0;
+    for (const CatalogueField &field : catalogue_fields)
+        if (field.kind != FieldKind::number) used += strlen(text_of(record, field)) + 1;
+    explicit_bzero(record->texts, used);
+    free(record->texts);
+    record->texts = nullptr;
+}
+
+// Every text field of `record` pointed at the texts packed in `block`, in
+// table order (all empty when there is no block); numbers set to 0.
+void adopt_texts(ShareRecord *record, char *block) {
+    static const char no_text[] = "";
+    free_texts(record);
+    record->texts = block;
+    for (const CatalogueField &field : catalogue_fields) {
+        if (field.kind == FieldKind::number) {
+            number_of(record, field) = 0;
+        } else if (block == nullptr) {
+            text_of(record, field) = no_text;
+        } else {
+            text_of(record, field) = block;
+            block += strlen(block) + 1;
+        }
     }
+}
+
+// The item's value of `field` in `scratch`, converted and cut to its width.
+void read_value(xmlNode *item, const CatalogueField &field, char *scratch) {
+    find_xml_child(item, xml_name(field.element), scratch, ACCESS_LIST_WIDTH);
     // Replaced before the cut, so a shortened value loses as little as possible.
     if (field.kind == FieldKind::recovered_text) recover_special_char(scratch);
-    copy_text_field(target, field.width, scratch);
+    if (field.kind != FieldKind::number) copy_text_field(scratch, field.width, scratch);
 }
 
-// Records are large and mostly empty: only the bytes that hold a value are
-// ever written, so clearing them clears the whole record without paging in
-// the rest. Keeps next.
-void clear_record_values(ShareRecord *record) {
-    for (const CatalogueField &field : catalogue_fields) {
-        char *target = reinterpret_cast<char *>(record) + field.offset;
-        size_t used = field.kind == FieldKind::number ? field.width
-                                                      : strnlen(target, field.width);
-        explicit_bzero(target, used);
+// A growing block of texts, each with its terminator.
+struct TextBlock {
+    char *texts;
+    size_t used;
+    size_t capacity;
+};
+
+bool block_append(TextBlock *block, const char *text) {
+    size_t length = strlen(text) + 1;
+    if (block->used + length > block->capacity) {
+        size_t capacity = 2 * (block->used + length);
+        char *grown = static_cast<char *>(realloc(block->texts, capacity));
+        if (grown == nullptr) return false;
+        block->texts = grown;
+        block->capacity = capacity;
     }
+    memcpy(block->texts + block->used, text, length);
+    block->used += length;
+    return true;
 }
 
-void read_item(ShareRecord *record, xmlNode *item, char *scratch) {
-    clear_record_values(record);
-    for (const CatalogueField &field : catalogue_fields) {
-        search_xml_children(item, xml_name(field.element), scratch, ACCESS_LIST_WIDTH);
-        store_field(record, field, scratch);
+// Reads one item into `record`, whose old values all go. -1 when memory
+// runs out (the record is then empty).
+int read_item(ShareRecord *record, xmlNode *item, char *scratch) {
+    int numbers[std::size(catalogue_fields)] = {};
+    TextBlock block = {};
+    bool whole = true;
+    for (size_t i = 0; i < std::size(catalogue_fields) && whole; ++i) {
+        const CatalogueField &field = catalogue_fields[i];
+        read_value(item, field, scratch);
+        if (field.kind == FieldKind::number)
+            numbers[i] = static_cast<int>(strtol(scratch, nullptr, 10));
+        else
+            whole = block_append(&block, scratch);
     }
+    if (!whole) {
+        free(block.texts);
+        adopt_texts(record, nullptr);
+        return -1;
+    }
+    adopt_texts(record, block.texts);
+    for (size_t i = 0; i < std::size(catalogue_fields); ++i)
+        if (catalogue_fields[i].kind == FieldKind::number)
+            number_of(record, catalogue_fields[i]) = numbers[i];
+    return 0;
 }
 
 // Items of the first <samba>: from its first <item> every following sibling
@@ -87,9 +150,9 @@ void read_item(ShareRecord *record, xmlNode *item, char *scratch) {
 int read_items(xmlDoc *doc, ShareRecord *head) {
     xmlNode *root = xmlDocGetRootElement(doc);
     if (root == nullptr) return -1;
-    xmlNode *samba = search_xml_children(root, xml_name("samba"), nullptr, 0);
+    xmlNode *samba = find_xml_child(root, xml_name("samba"), nullptr, 0);
     if (samba == nullptr) return -1;
-    xmlNode *item = search_xml_children(samba, xml_name("item"), nullptr, 0);
+    xmlNode *item = find_xml_child(samba, xml_name("item"), nullptr, 0);
     if (item == nullptr) return 0;
 
     char *scratch = static_cast<char *>(malloc(ACCESS_LIST_WIDTH));
@@ -107,7 +170,10 @@ int read_items(xmlDoc *doc, ShareRecord *head) {
             current->next = added;
             current = added;
         }
-        read_item(current, item, scratch);
+        if (read_item(current, item, scratch) != 0) {
+            result = -1;
+            break;
+        }
     }
     free(scratch);
     return result;
@@ -127,7 +193,11 @@ int read_catalogue(ShareRecord *head, const char *file_path) {
 
 }  // namespace
 
-ShareRecord *new_share_record() { return new_zeroed_record<ShareRecord>(); }
+ShareRecord *new_share_record() {
+    ShareRecord *record = new_zeroed_record<ShareRecord>();
+    if (record != nullptr) adopt_texts(record, nullptr);
+    return record;
+}
 
 int read_share_catalogue(ShareRecord *head) { return read_catalogue(head, SYSTEM_CATALOGUE); }
 
@@ -138,8 +208,8 @@ int read_share_catalogue_file(ShareRecord *head, const char *file_path) {
 void free_share_catalogue(ShareRecord *head) {
     while (head != nullptr) {
         ShareRecord *next = head->next;
-        clear_record_values(head);
-        head->next = nullptr;
+        free_texts(head);
+        explicit_bzero(head, sizeof *head);
         free(head);
         head = next;
     }

@@ -2,32 +2,42 @@
 // <item> of <samba> in /var/www/xml/smb.xml (or a USB volume's .smbm.xml).
 // An item without a name is overwritten by the next item, so only the last
 // record can have an empty name. name, comment and path have "&amp;"
-// replaced by "&"; overlong values are cut to their field.
+// replaced by "&"; a value longer than its width (which counts the NUL) is
+// cut to it at a character boundary.
+//
+// A catalogue holds thousands of shares whose access lists may each be
+// 55,295 characters long but are mostly short, so a record holds its texts
+// compactly: every text field points into one block the record owns, and is
+// never null (an empty text is "").
 #ifndef DAVSYNC_SHARES_SHARE_CATALOGUE_H
 #define DAVSYNC_SHARES_SHARE_CATALOGUE_H
 
-constexpr int ACCESS_LIST_WIDTH = 55296;
+#include <cstddef>
+
+constexpr size_t ACCESS_LIST_WIDTH = 55296;
 
 struct ShareRecord {
     int volume_raid;
-    char hd_serial[512];
-    char name[1024];
-    char comment[512];
-    char path[4096];
-    char browseable[8];
-    char public_[8];  // element "public"; a C++ keyword does not allow the bare name
-    char oplocks[8];
-    char map_archive[8];
-    char read_list[ACCESS_LIST_WIDTH];
-    char write_list[ACCESS_LIST_WIDTH];
-    char invalid_users[ACCESS_LIST_WIDTH];
+    const char *hd_serial;      // width 512
+    const char *name;           // width 1024
+    const char *comment;        // width 512
+    const char *path;           // width 4096
+    const char *browseable;     // width 8
+    const char *public_;        // width 8; element "public", a C++ keyword
+    const char *oplocks;        // width 8
+    const char *map_archive;    // width 8
+    const char *read_list;      // width ACCESS_LIST_WIDTH
+    const char *write_list;     // width ACCESS_LIST_WIDTH
+    const char *invalid_users;  // width ACCESS_LIST_WIDTH
     int recycle_enable;
     int recycle_tree;
     int web_public;
+    char *texts;  // the block every text field points into
     ShareRecord *next;
 };
 
-// Zero-filled record with a null next, or null when memory is exhausted.
+// An empty record (every text "", every number 0) with a null next, or null
+// when memory is exhausted.
 ShareRecord *new_share_record();
 // Read the catalogue into the list at a fresh `head`. 0 on success, also
 // when <samba> holds no <item>; -1 for a null head, a missing or unparsable

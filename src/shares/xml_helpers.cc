@@ -21,18 +21,23 @@ void copy_node_content(xmlNode *node, char *buffer, size_t size) {
 
 }  // namespace
 
-extern "C" xmlNode *search_xml_children(xmlNode *parent, const xmlChar *name, char *buffer,
-                                        int size) {
+xmlNode *find_xml_child(xmlNode *parent, const xmlChar *name, char *buffer, size_t size) {
     bool with_buffer = buffer != nullptr && size > 0;
-    if (with_buffer) memset(buffer, 0, static_cast<size_t>(size));
+    if (with_buffer) buffer[0] = '\0';
     if (parent == nullptr || name == nullptr) return nullptr;
     for (xmlNode *child = parent->children; child != nullptr; child = child->next) {
         // Comments and text nodes have names too, and take part on purpose.
         if (child->name == nullptr || xmlStrcmp(child->name, name) != 0) continue;
-        if (with_buffer) copy_node_content(child, buffer, static_cast<size_t>(size));
+        if (with_buffer) copy_node_content(child, buffer, size);
         return child;
     }
     return nullptr;
+}
+
+extern "C" xmlNode *search_xml_children(xmlNode *parent, const xmlChar *name, char *buffer,
+                                        int size) {
+    if (buffer != nullptr && size > 0) memset(buffer, 0, static_cast<size_t>(size));
+    return find_xml_child(parent, name, buffer, size > 0 ? static_cast<size_t>(size) : 0);
 }
 
 extern "C" char *recover_special_char(char *text) {

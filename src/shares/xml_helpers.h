@@ -20,6 +20,10 @@ char *recover_special_char(char *text);
 void free_xml_memory(xmlDoc *doc);
 }
 
+// search_xml_children without clearing the buffer: only the text and its
+// terminator are written (an empty text when no child matches).
+xmlNode *find_xml_child(xmlNode *parent, const xmlChar *name, char *buffer, size_t size);
+
 // Keeps libxml2 from printing parse errors: the tool prints nothing but its
 // usage text, and a reader's result already tells a broken file.
 void quiet_xml_errors();

@@ -5,6 +5,7 @@
 #include <fstream>
 #include <gtest/gtest.h>
 #include <libxml/parser.h>
+#include <memory>
 #include <string>
 #include <tuple>
 #include <vector>
@@ -28,17 +29,20 @@ struct TempDir {
 };
 
 // Reads a catalogue of the given <config> body; the records in list order.
-struct Catalogue { int result = 0; std::vector<ShareRecord> records; };
+struct Catalogue {
+    int result = 0;
+    std::shared_ptr<ShareRecord> head;
+    std::vector<const ShareRecord *> records;
+};
 
 Catalogue read_catalogue(const std::string &xml) {
     TempDir temp;
     std::string path = temp.write("smb.xml", xml);
-    ShareRecord *head = new_share_record();
     Catalogue catalogue;
-    catalogue.result = read_share_catalogue_file(head, path.c_str());
-    for (ShareRecord *record = head; record != nullptr; record = record->next)
-        catalogue.records.push_back(*record);
-    free_share_catalogue(head);
+    catalogue.head.reset(new_share_record(), free_share_catalogue);
+    catalogue.result = read_share_catalogue_file(catalogue.head.get(), path.c_str());
+    for (ShareRecord *record = catalogue.head.get(); record != nullptr; record = record->next)
+        catalogue.records.push_back(record);
     return catalogue;
 }
 
@@ -147,7 +151,7 @@ TEST(ShareCatalogue, FailuresLeaveTheHeadUnchanged) {
         Catalogue catalogue = read_catalogue(c.xml);
         EXPECT_EQ(catalogue.result, c.result) << c.xml;
         ASSERT_EQ(catalogue.records.size(), 1u);
-        EXPECT_STREQ(catalogue.records[0].name, "");
+        EXPECT_STREQ(catalogue.records[0]->name, "");
     }
     ShareRecord *head = new_share_record();
     EXPECT_EQ(read_share_catalogue_file(head, "/nonexistent/smb.xml"), -1);
@@ -169,7 +173,7 @@ TEST(ShareCatalogue, ReadsEveryFieldFromTheFirstOccurrence) {
         "</samba></config>");
     ASSERT_EQ(catalogue.result, 0);
     ASSERT_EQ(catalogue.records.size(), 1u);
-    const ShareRecord &r = catalogue.records[0];
+    const ShareRecord &r = *catalogue.records[0];
     EXPECT_EQ((std::vector<std::string>{r.hd_serial, r.name, r.comment, r.path, r.browseable,
                                         r.public_, r.oplocks, r.map_archive, r.read_list,
                                         r.write_list, r.invalid_users}),
@@ -192,16 +196,16 @@ TEST(ShareCatalogue, NamelessItemsAreOverwrittenByTheNext) {
             read_catalogue(std::string("<config><samba>") + c.samba + "</samba></config>");
         EXPECT_EQ(catalogue.result, 0) << c.samba;
         std::vector<std::string> names;
-        for (const ShareRecord &record : catalogue.records) names.push_back(record.name);
+        for (const ShareRecord *record : catalogue.records) names.push_back(record->name);
         EXPECT_EQ(names, c.names) << c.samba;
     }
     // The record is cleared before the next item; a last nameless one keeps its fields.
     Catalogue reused = read_catalogue(
         "<config><samba><item><path>/a</path><web_public>1</web_public></item>"
         "<item><name>B</name></item><item><path>/x</path></item></samba></config>");
-    EXPECT_STREQ(reused.records[0].path, "");
-    EXPECT_EQ(reused.records[0].web_public, 0);
-    EXPECT_STREQ(reused.records[1].path, "/x");
+    EXPECT_STREQ(reused.records[0]->path, "");
+    EXPECT_EQ(reused.records[0]->web_public, 0);
+    EXPECT_STREQ(reused.records[1]->path, "/x");
 }
 
 TEST(ShareCatalogue, OverlongValuesAreCutToTheirField) {
@@ -210,7 +214,7 @@ TEST(ShareCatalogue, OverlongValuesAreCutToTheirField) {
         "<config><samba><item><name>" + name + "</name><public>yesyesyes</public>"
         "<read_list>" + list + "</read_list><path>&amp;amp;" + std::string(5000, 'p') +
         "</path></item></samba></config>");
-    const ShareRecord &r = catalogue.records[0];
+    const ShareRecord &r = *catalogue.records[0];
     EXPECT_EQ(std::string(r.name), name.substr(0, 1023));
     EXPECT_STREQ(r.public_, "yesyesy");
     EXPECT_EQ(std::string(r.read_list), list.substr(0, ACCESS_LIST_WIDTH - 1));
