@@ -15,12 +15,6 @@ NameNode *new_name_node() { return new_zeroed_record<NameNode>(); }
 
 void free_name_list(NameNode *head) { free_record_list(head); }
 
-bool name_list_holds(const NameNode *head, const char *name) {
-    for (const NameNode *node = head; node != nullptr; node = node->next)
-        if (strcmp(node->name, name) == 0) return true;
-    return false;
-}
-
 static bool fits_name_node(const char *name) { return strlen(name) < sizeof(NameNode::name); }
 
 // Names too long for a node are left out rather than cut: a cut name could

@@ -15,11 +15,8 @@ struct NameNode {
     NameNode *next;
 };
 
-NameNode *new_name_node();
+[[nodiscard]] NameNode *new_name_node();
 void free_name_list(NameNode *head);
-// True when a node of the list holds exactly `name` (the empty open slot
-// holds the empty name).
-bool name_list_holds(const NameNode *head, const char *name);
 // Members of group `group_name` in database order, no open slot; an unknown
 // or memberless group gives one empty node. 0, or -1 when memory runs out
 // (nothing stored).

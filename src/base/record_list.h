@@ -6,7 +6,7 @@
 #include <cstdlib>
 
 // A zero-filled record (next null), or null when memory is exhausted.
-template <typename Record> Record *new_zeroed_record() {
+template <typename Record> [[nodiscard]] Record *new_zeroed_record() {
     return static_cast<Record *>(calloc(1, sizeof(Record)));
 }
 

@@ -29,8 +29,8 @@ static bool begins_with(const char *word, const char *command) {
 // Zero-fills the area and decodes the argument into it; false when the
 // decoded text would not fit whole.
 static bool decode_into_area(const char *argument, char *area) {
-    memset(area, 0, ARGUMENT_AREA_WIDTH);
-    return strlen(argument) < ARGUMENT_AREA_WIDTH && decode_argument(argument, area) == 0;
+    memset(area, 0, LINE_BUFFER_WIDTH);
+    return strlen(argument) < LINE_BUFFER_WIDTH && decode_argument(argument, area) == 0;
 }
 
 // A volume directory gains its '/', a volume root stays, any other path
@@ -38,27 +38,27 @@ static bool decode_into_area(const char *argument, char *area) {
 static void normalise_trailing_slash(char *path) {
     size_t length = strlen(path);
     if (length == VOLUME_PREFIX_LENGTH)
-        append_volume_root_slash(path, ARGUMENT_AREA_WIDTH);
+        append_volume_root_slash(path, LINE_BUFFER_WIDTH);
     else if (length != VOLUME_PREFIX_LENGTH + 1 && length > 0 && path[length - 1] == '/')
         path[length - 1] = '\0';
 }
 
 static int run_get(int words, char **argv) {
-    char area[ARGUMENT_AREA_WIDTH];
+    char area[LINE_BUFFER_WIDTH];
     if (words != 2 || !decode_into_area(argv[2], area)) return bad_call();
     webdav_get(area);
     return 0;
 }
 
 static int run_del_user(int words, char **argv) {
-    char area[ARGUMENT_AREA_WIDTH];
+    char area[LINE_BUFFER_WIDTH];
     if (words != 2 || format_text_field(area, sizeof area, "#%s#", argv[2]) != 0) return bad_call();
     webdav_del_user(area);
     return 0;
 }
 
 static int run_del(int words, char **argv) {
-    char area[ARGUMENT_AREA_WIDTH];
+    char area[LINE_BUFFER_WIDTH];
     if (words != 2 || !decode_into_area(argv[2], area)) return bad_call();
     normalise_trailing_slash(area);
     webdav_del(area);
@@ -68,7 +68,7 @@ static int run_del(int words, char **argv) {
 static int run_do_merge(int words, char **argv, int merge) {
     if (words != 2) return bad_call();
     if (access(argv[2], R_OK) != 0) return BAD_CALL;  // silently: the caller checks the file
-    char area[ARGUMENT_AREA_WIDTH];
+    char area[LINE_BUFFER_WIDTH];
     if (!decode_into_area(argv[2], area)) return bad_call();
     webdav_do_merge(area, merge);
     return 0;

@@ -4,9 +4,6 @@
 #ifndef DAVSYNC_CLI_DISPATCH_H
 #define DAVSYNC_CLI_DISPATCH_H
 
-#include "base/appliance_paths.h"
-
-constexpr size_t ARGUMENT_AREA_WIDTH = LINE_BUFFER_WIDTH;
 
 int dispatch_command(int argc, char **argv);
 

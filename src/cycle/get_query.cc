@@ -7,7 +7,7 @@
 #include "base/appliance_paths.h"
 #include "base/safe_file.h"
 #include "base/text_field.h"
-#include "cycle/regeneration.h"
+#include "cycle/config_switches.h"
 
 // Replaced whole, so the caller never reads a half-written answer.
 int write_webdav_query(const DavShareEntry *answer) {
@@ -45,7 +45,7 @@ static bool copy_escaped(const char *text, char *field, size_t width) {
 static int answer_volume_folder(const char *query_path, DavShareEntry *answer) {
     DavShareEntry *entries = new_dav_share_entry();
     int allen_unused = 0;
-    if (entries == nullptr || load_dav_share_lists(entries, &allen_unused) < 0) {
+    if (entries == nullptr || load_dav_share_lists_for(entries, &allen_unused, query_path) < 0) {
         free_dav_share_list(entries);
         return -1;
     }

@@ -4,12 +4,13 @@
 
 #include "base/shell_command.h"
 #include "base/text_field.h"
+#include "cycle/config_switches.h"
 #include "cycle/run_locks.h"
 #include "output/conf_build.h"
 #include "output/dav_conf.h"
 #include "output/usb_shares.h"
 #include "output/webdav_note.h"
-#include "platform/config_db.h"
+
 
 CycleVariant start_variant() {
     CycleVariant variant;
@@ -31,15 +32,6 @@ CycleVariant editing_variant() {
     variant.allen = ALLEN_ENABLE_FLAG;
     return variant;
 }
-
-// A switch of the configuration database is on only when its text is exactly "1".
-static bool config_switch_on(const char *slash_path) {
-    char value[8] = {};
-    xml_get_str(slash_path, sizeof value, value);
-    return value[0] == '1' && value[1] == '\0';
-}
-
-int read_webdav_enable_flag() { return config_switch_on("/system_mgr/webdav/enable") ? 1 : 0; }
 
 static void release_node_lock(CycleRun *run) {
     if (!run->lock_taken) return;

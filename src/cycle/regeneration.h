@@ -70,7 +70,4 @@ int cycle_finish(CycleRun *run);
 // The failure exit for a command that gives up between the two halves.
 int cycle_abort(CycleRun *run);
 
-// The WebDAV enable flag: 1 exactly when /system_mgr/webdav/enable is "1".
-int read_webdav_enable_flag();
-
 #endif

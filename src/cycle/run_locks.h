@@ -9,7 +9,7 @@
 // Something planted at the name (a link, a FIFO, another user's file) is
 // removed and the file made anew. -1 when no lock could be had: the file
 // cannot be made, or the lock call failed; the run then goes on unlocked.
-int lock_node_file();
+[[nodiscard]] int lock_node_file();
 // Removes the lock file while still holding the lock, then unlocks and closes.
 void unlock_node_file(int fd);
 // Sleeps two seconds when the start-lock file exists, then creates it or

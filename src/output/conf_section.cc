@@ -96,11 +96,10 @@ static void write_authenticated_block(FILE *conf, GroupTable *groups, const Shar
 void write_share_section(FILE *conf, GroupTable *groups, const char *shared_name, bool dav_on,
                          const ShareRecord *rules) {
     char line[LINE_BUFFER_WIDTH];
-    format_text_field(line, sizeof line, "Alias \"/%s\" \"/usr/local/apache2_dav/webdav/%s\"\n",
-                      shared_name, shared_name);
-    fputs(line, conf);
-    format_text_field(line, sizeof line, "<Directory \"/usr/local/apache2_dav/webdav/%s\">\n",
+    format_text_field(line, sizeof line, "Alias \"/%s\" \"%s/%s\"\n", shared_name, LINK_DIR,
                       shared_name);
+    fputs(line, conf);
+    format_text_field(line, sizeof line, "<Directory \"%s/%s\">\n", LINK_DIR, shared_name);
     fputs(line, conf);
     fputs(dav_on ? "\tDav On\n" : "\tDav Off\n", conf);
     fputs("\tOptions FollowSymLinks\n"

@@ -13,7 +13,7 @@
 int append_usb_shares(ConfBuild *build);
 // The mounted subdirectories of `directory` in reading order, as
 // "<directory>/<name>", followed by one empty node. Null on failure.
-PathNode *scan_mounted_dirs(const char *directory);
+[[nodiscard]] PathNode *scan_mounted_dirs(const char *directory);
 // 0 when /etc/mtab has an entry whose mount directory is exactly `path`.
 int is_mount_point(const char *path);
 // NAME of the first line of /etc/shared_name ("NAME = VALUE") that contains

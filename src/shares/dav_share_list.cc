@@ -22,8 +22,6 @@ constexpr char ISO_LIST[] = "lighty_iso.xml";
 constexpr size_t ITEM_TEXT_WIDTH = DAV_TEXT_WIDTH + 1;
 constexpr size_t NUMBER_TEXT_WIDTH = 64;
 
-const xmlChar *xml_name(const char *name) { return reinterpret_cast<const xmlChar *>(name); }
-
 int to_int(const char *text) { return static_cast<int>(strtol(text, nullptr, 10)); }
 
 // Reads one item's elements into `entry`; non-empty texts only, a later
@@ -267,18 +265,22 @@ int read_volume_share_list_noting(DavShareEntry *entry, const VolumeEntry *volum
     return result;
 }
 
-int load_dav_share_lists(DavShareEntry *head, int *allen_out) {
-    return load_dav_share_lists_noting(head, allen_out, nullptr);
+namespace {
+
+// Whether a list can hold an entry whose path is `only_path` (every list can
+// when that is null): a volume's paths all begin with its directory.
+bool may_hold(const char *directory, const char *only_path) {
+    return only_path == nullptr || strncmp(only_path, directory, strlen(directory)) == 0;
 }
 
-int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *unreadable) {
+int load_lists(DavShareEntry *head, int *allen_out, PathNode *unreadable, const char *only_path) {
     VolumeEntry *volumes = scan_volume_table();
     if (volumes == nullptr) return -1;
 
     int allen = 0;
     DavShareEntry *target = head;
     for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
-        if (volume->mount_dir[0] == '\0') continue;
+        if (volume->mount_dir[0] == '\0' || !may_hold(volume->mount_dir, only_path)) continue;
         if (target == nullptr) target = new_dav_share_entry();
         int read = read_volume_share_list_noting(target, volume, VOLUME_LIST, &allen, unreadable);
         *allen_out = allen;
@@ -296,7 +298,7 @@ int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *u
     // their entries are all in the list read.
     target = nullptr;
     PathNode *unreadable_iso = new_path_node();
-    bool iso_read = false;
+    bool iso_read = !may_hold(ISO_DIR, only_path);
     for (const VolumeEntry *volume = volumes; volume != nullptr && !iso_read; volume = volume->next) {
         if (volume->mount_dir[0] == '\0') continue;
         if (target == nullptr) target = new_dav_share_entry();
@@ -315,6 +317,20 @@ int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *u
     free_dav_share_list(target);
     free_volume_list(volumes);
     return 0;
+}
+
+}  // namespace
+
+int load_dav_share_lists(DavShareEntry *head, int *allen_out) {
+    return load_lists(head, allen_out, nullptr, nullptr);
+}
+
+int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *unreadable) {
+    return load_lists(head, allen_out, unreadable, nullptr);
+}
+
+int load_dav_share_lists_for(DavShareEntry *head, int *allen_out, const char *path) {
+    return load_lists(head, allen_out, nullptr, path);
 }
 
 int read_share_list_file(DavShareEntry *head, const char *file_path) {

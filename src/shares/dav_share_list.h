@@ -23,7 +23,7 @@ struct DavShareEntry {
     DavShareEntry *next;
 };
 
-DavShareEntry *new_dav_share_entry();
+[[nodiscard]] DavShareEntry *new_dav_share_entry();
 void free_dav_share_list(DavShareEntry *head);
 
 // Reads one list file of one volume into the list at `entry` (its next is
@@ -43,6 +43,10 @@ int load_dav_share_lists(DavShareEntry *head, int *allen_out);
 // The same, noting the lists whose entries could not be read: every volume
 // list that does not parse, and the iso copies that do not when none does.
 int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *unreadable);
+// The same, reading only the lists that can hold an entry with exactly
+// `path`: those of the volumes it lies on, and the iso list for a path below
+// /mnt/isoMount. Entries with that path come in the same order.
+int load_dav_share_lists_for(DavShareEntry *head, int *allen_out, const char *path);
 // The do/merge input file (full paths, count and allen ignored). 0 or -1.
 int read_share_list_file(DavShareEntry *head, const char *file_path);
 // Writes and stores the list of every directory in `directories` ("/mnt/isoMount"

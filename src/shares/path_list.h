@@ -11,7 +11,7 @@ struct PathNode {
     PathNode *next;
 };
 
-PathNode *new_path_node();
+[[nodiscard]] PathNode *new_path_node();
 // Appends `text` unless a node holds it already: 0 when appended (a null
 // head appends nothing and also gives 0), -1 when present. An empty text is
 // never present, so it appends an empty node each time. A text too long for

@@ -51,8 +51,6 @@ const CatalogueField catalogue_fields[] = {
 #undef NUMBER_FIELD
 #undef TEXT_FIELD
 
-const xmlChar *xml_name(const char *name) { return reinterpret_cast<const xmlChar *>(name); }
-
 int &number_of(ShareRecord *record, const CatalogueField &field) {
     return *reinterpret_cast<int *>(reinterpret_cast<char *>(record) + field.offset);
 }

@@ -38,7 +38,7 @@ struct ShareRecord {
 
 // An empty record (every text "", every number 0) with a null next, or null
 // when memory is exhausted.
-ShareRecord *new_share_record();
+[[nodiscard]] ShareRecord *new_share_record();
 // Read the catalogue into the list at a fresh `head`. 0 on success, also
 // when <samba> holds no <item>; -1 for a null head, a missing or unparsable
 // file, no root or no <samba>, or memory exhausted (records read so far stay).

@@ -14,7 +14,7 @@ struct VolumeEntry {
 };
 
 // Zero-filled entry, or null when memory is exhausted.
-VolumeEntry *new_volume_entry();
+[[nodiscard]] VolumeEntry *new_volume_entry();
 // Fills the table at `head` (non-null, zero-filled): the first volume goes
 // into head, the rest are appended. 0 when at least one volume was found,
 // -1 when none was, /etc/mtab cannot be opened or memory runs out. Mount

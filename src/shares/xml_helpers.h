@@ -24,6 +24,10 @@ void free_xml_memory(xmlDoc *doc);
 // terminator are written (an empty text when no child matches).
 xmlNode *find_xml_child(xmlNode *parent, const xmlChar *name, char *buffer, size_t size);
 
+inline const xmlChar *xml_name(const char *name) {
+    return reinterpret_cast<const xmlChar *>(name);
+}
+
 // Keeps libxml2 from printing parse errors: the tool prints nothing but its
 // usage text, and a reader's result already tells a broken file.
 void quiet_xml_errors();
