@@ -3,6 +3,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <dirent.h>
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -89,6 +90,55 @@ int replacement_commit(Replacement *replacement) {
 void replacement_abandon(Replacement *replacement) {
     if (replacement->temporary[0] != '\0') unlink(replacement->temporary);
     replacement->temporary[0] = '\0';
+}
+
+static bool is_temporary_name(const char *name, const char *prefix) {
+    size_t length = strlen(prefix);
+    return strncmp(name, prefix, length) == 0 && strlen(name) == length + 6;
+}
+
+static void remove_folder_files(int dir_fd, const char *name) {
+    int fd = openat(dir_fd, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    DIR *folder = fd == -1 ? nullptr : fdopendir(fd);
+    if (folder == nullptr) {
+        if (fd != -1) close(fd);
+        return;
+    }
+    while (const struct dirent *entry = readdir(folder))
+        if (entry->d_name[0] != '.' || (strcmp(entry->d_name, ".") && strcmp(entry->d_name, "..")))
+            unlinkat(dirfd(folder), entry->d_name, 0);
+    closedir(folder);
+}
+
+void remove_stale_temporaries(const char *dir, const char *prefix) {
+    DIR *listing = opendir(dir);
+    if (listing == nullptr) return;
+    int dir_fd = dirfd(listing);
+    while (const struct dirent *entry = readdir(listing)) {
+        struct stat status;
+        if (!is_temporary_name(entry->d_name, prefix) ||
+            fstatat(dir_fd, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0 ||
+            status.st_uid != geteuid())
+            continue;
+        if (S_ISDIR(status.st_mode)) {
+            remove_folder_files(dir_fd, entry->d_name);
+            unlinkat(dir_fd, entry->d_name, AT_REMOVEDIR);
+        } else if (S_ISREG(status.st_mode)) {
+            unlinkat(dir_fd, entry->d_name, 0);
+        }
+    }
+    closedir(listing);
+}
+
+void remove_stale_replacements(const char *path) {
+    const char *slash = strrchr(path, '/');
+    if (slash == nullptr || slash == path) return;
+    char dir[4096];
+    char prefix[4096];
+    if (copy_text_prefix(dir, sizeof dir, path, static_cast<size_t>(slash - path)) != 0 ||
+        format_text_field(prefix, sizeof prefix, ".%s.", slash + 1) != 0)
+        return;
+    remove_stale_temporaries(dir, prefix);
 }
 
 int replace_file(const char *path, const char *data, size_t length, mode_t mode) {

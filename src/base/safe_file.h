@@ -32,6 +32,13 @@ struct Replacement {
 [[nodiscard]] int replacement_commit(Replacement *replacement);
 void replacement_abandon(Replacement *replacement);
 
+// Removes what a killed run left of its temporary files and folders in
+// `dir`: this user's entries named `prefix` and six more characters (a
+// folder with the files in it). Only for callers that hold the node lock.
+void remove_stale_temporaries(const char *dir, const char *prefix);
+// The same for the temporary files of replace_file and replacement_write.
+void remove_stale_replacements(const char *path);
+
 // An O_PATH descriptor of the directory `path`, resolved component by
 // component without following any link; "." and ".." are refused. -1 on
 // failure.

@@ -44,6 +44,9 @@ static void place_note(ConfBuild *build) {
 }
 
 int conf_build_place(ConfBuild *build) {
+    // Under the node lock, a temporary file of ours can only be a killed run's.
+    remove_stale_replacements(PLACED_CONF_FILE);
+    remove_stale_replacements(NOTE_FILE);
     int conf_closed = memory_file_close(&build->conf);
     int note_closed = memory_file_close(&build->note);
     Replacement conf;

@@ -194,14 +194,19 @@ bool is_kept(const char *list_name, const char *volume_dir, const PathNode *unre
 }
 
 // The lists go to the volume library as files named like the stored ones;
-// they are written in a folder only this run can write to.
+// they are written in a folder only this run can write to. Writers hold the
+// node lock, so a staging folder left in /tmp is a killed run's.
+constexpr char STAGING_TEMPLATE[] = "/tmp/davsync.XXXXXX";
+
+void remove_stale_staging() { remove_stale_temporaries("/tmp", "davsync."); }
+
 struct ListStaging {
     char dir[32];
     char file[64];
 };
 
 bool stage_list(ListStaging *staging, const char *list_name, const MemoryFile &text) {
-    copy_text(staging->dir, "/tmp/davsync.XXXXXX");
+    copy_text(staging->dir, STAGING_TEMPLATE);
     staging->file[0] = '\0';
     if (mkdtemp(staging->dir) == nullptr) return false;
     if (format_text_field(staging->file, sizeof staging->file, "%s/%s", staging->dir,
@@ -347,6 +352,7 @@ int read_share_list_file(DavShareEntry *head, const char *file_path) {
 
 void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen,
                            const PathNode *unreadable) {
+    remove_stale_staging();
     for (const PathNode *node = directories; node != nullptr; node = node->next) {
         const char *directory = node->path;
         if (directory[0] == '\0') continue;
@@ -362,6 +368,7 @@ void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directo
 
 void write_volume_share_lists(const DavShareEntry *entries, int allen,
                               const PathNode *unreadable) {
+    remove_stale_staging();
     VolumeEntry *volumes = scan_volume_table();
     for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
         if (volume->mount_dir[0] == '\0') continue;
