@@ -80,8 +80,10 @@ static int volume_index_in_save_path_line(const char *line) {
     return index < 0 ? -1 : index;
 }
 
-int read_p2p_save_volume() {
-    FILE *settings = fopen("/etc/NAS_CFG/p2psettings.xml", "r");
+int read_p2p_save_volume() { return read_p2p_save_volume_from("/etc/NAS_CFG/p2psettings.xml"); }
+
+int read_p2p_save_volume_from(const char *settings_path) {
+    FILE *settings = fopen(settings_path, "r");
     if (settings == nullptr) return -1;
     if (flock(fileno(settings), LOCK_EX) != 0) {
         fclose(settings);

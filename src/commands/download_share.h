@@ -13,5 +13,7 @@ int add_p2p_share_entry(DavShareEntry *entries);
 int add_amule_share_entry(DavShareEntry *entries);
 // Volume index of the p2p download location in the settings file, or -1.
 int read_p2p_save_volume();
+// The same scan of another settings file.
+int read_p2p_save_volume_from(const char *settings_path);
 
 #endif

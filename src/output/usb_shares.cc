@@ -67,7 +67,11 @@ PathNode *scan_mounted_dirs(const char *directory) {
 }
 
 int lookup_shared_name(const char *dir_name, char *result) {
-    FILE *names = fopen("/etc/shared_name", "r");
+    return lookup_shared_name_in("/etc/shared_name", dir_name, result);
+}
+
+int lookup_shared_name_in(const char *file_path, const char *dir_name, char *result) {
+    FILE *names = fopen(file_path, "r");
     if (names == nullptr) return -1;
     if (flock(fileno(names), LOCK_EX) != 0) {
         fclose(names);

@@ -19,5 +19,7 @@ int is_mount_point(const char *path);
 // anywhere, into `result` (512 characters, zero-filled by the caller).
 // 0 when the file was searched, -1 when it cannot be opened or locked.
 int lookup_shared_name(const char *dir_name, char *result);
+// The same lookup in another file of that format.
+int lookup_shared_name_in(const char *file_path, const char *dir_name, char *result);
 
 #endif
