@@ -3,9 +3,7 @@
 #include "fuzz_input.h"
 #include "shares/share_catalogue.h"
 
-template <size_t... N> static void check_fields(const char (&...fields)[N]) {
-    (FUZZ_CHECK(strnlen(fields, N) < N), ...);
-}
+static void check_width(const char *text, size_t width) { FUZZ_CHECK(strlen(text) < width); }
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     std::string file = write_input("smb.xml", data, size);
@@ -13,9 +11,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     int result = read_share_catalogue_file(head, file.c_str());
     FUZZ_CHECK(result == 0 || result == -1);
     for (const ShareRecord *record = head; record != nullptr; record = record->next) {
-        check_fields(record->hd_serial, record->name, record->comment, record->path,
-                     record->browseable, record->public_, record->oplocks, record->map_archive,
-                     record->read_list, record->write_list, record->invalid_users);
+        check_width(record->hd_serial, 512), check_width(record->name, 1024);
+        check_width(record->comment, 512), check_width(record->path, 4096);
+        for (const char *flag : {record->browseable, record->public_, record->oplocks,
+                                 record->map_archive})
+            check_width(flag, 8);
+        for (const char *list : {record->read_list, record->write_list, record->invalid_users})
+            check_width(list, ACCESS_LIST_WIDTH);
         FUZZ_CHECK(record->name[0] != '\0' || record->next == nullptr);
     }
     free_share_catalogue(head);
