@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # The appliance around davsync, for the demo and the real-server tests; meant
 # to be sourced by bash. An appliance is a root folder in $TMPDIR (or /tmp)
 # holding what the tool and its WebDAV server read and write at their fixed
@@ -228,17 +229,20 @@ appliance_run() {
     ' appliance "$root" "$@"
 }
 
-# Stops the server, ends every process still running in the root (by pid),
-# and removes the root once nothing is mounted in it.
+# Stops the server, ends what else still runs in the root (by pid, and then
+# the status is 1: a stopped server leaves nothing), and removes the root
+# once nothing is mounted in it.
 appliance_remove() {
-    local root=$1 link pid
+    local root=$1 status=0 leftovers pid tries
     [[ -n $root && -d $root ]] || return 0
     [[ -x "$root/usr/local/sbin/apache" ]] && appliance_run "$root" apache stop dav
-    for link in $(find /proc/[0-9]*/root -maxdepth 0 -lname "$root*" 2>/dev/null); do
-        pid=${link#/proc/}
-        kill -KILL "${pid%/root}" 2>/dev/null
-    done
-    for ((pid = 0; pid < 50; pid++)); do
+    leftovers=$(find /proc/[0-9]*/root -maxdepth 0 -lname "$root*" 2>/dev/null | cut -d/ -f3)
+    if [[ -n $leftovers ]]; then
+        echo "appliance: processes left running in $root, ended:" $leftovers >&2
+        for pid in $leftovers; do kill -KILL "$pid" 2>/dev/null; done
+        status=1
+    fi
+    for ((tries = 0; tries < 50; tries++)); do
         grep -q " ${root}[/ ]" /proc/self/mountinfo || break
         sleep 0.1
     done
@@ -247,6 +251,7 @@ appliance_remove() {
         return 1
     fi
     rm -rf --one-file-system "$root"
+    return $status
 }
 
 # access_codes URL [USER:PASSWORD]: list, read and write as seen over HTTP:
