@@ -235,11 +235,14 @@ appliance_run() {
 appliance_remove() {
     local root=$1 status=0 leftovers pid tries
     [[ -n $root && -d $root ]] || return 0
-    [[ -x "$root/usr/local/sbin/apache" ]] && appliance_run "$root" apache stop dav
-    leftovers=$(find /proc/[0-9]*/root -maxdepth 0 -lname "$root*" 2>/dev/null | cut -d/ -f3)
+    if [[ -x "$root/usr/local/sbin/apache" ]]; then
+        appliance_run "$root" apache stop dav || status=1
+    fi
+    # find fails on the processes that end while it looks.
+    leftovers=$(find /proc/[0-9]*/root -maxdepth 0 -lname "$root*" 2>/dev/null | cut -d/ -f3) || true
     if [[ -n $leftovers ]]; then
         echo "appliance: processes left running in $root, ended:" $leftovers >&2
-        for pid in $leftovers; do kill -KILL "$pid" 2>/dev/null; done
+        for pid in $leftovers; do kill -KILL "$pid" 2>/dev/null || true; done
         status=1
     fi
     for ((tries = 0; tries < 50; tries++)); do
