@@ -5,8 +5,10 @@
 #include "access/user_list.h"
 #include "base/appliance_paths.h"
 #include "base/text_field.h"
+#include "output/link_dir.h"
 
 bool is_conf_safe_name(const char *shared_name) {
+    if (!is_link_name(shared_name)) return false;
     for (const char *c = shared_name; *c != '\0'; ++c) {
         unsigned char byte = static_cast<unsigned char>(*c);
         if (byte == '"' || byte == '\\' || byte < 0x20 || byte == 0x7F) return false;

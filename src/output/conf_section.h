@@ -9,8 +9,10 @@
 #include "access/user_list.h"
 #include "shares/share_catalogue.h"
 
-// A shared name stands in double quotes in the configuration: one with a
-// double quote, a backslash or a control byte would break it.
+// A shared name stands in double quotes in the configuration, after the
+// link directory: one with a double quote, a backslash or a control byte
+// would break the file, and one that is no link name ("", ".", "..", or with
+// a '/') would name a folder outside the link directory, up to "/".
 bool is_conf_safe_name(const char *shared_name);
 // Rows Alias to the blank line after </Directory>. `rules` null gives the
 // open access block; otherwise the block follows the share's lists: open
