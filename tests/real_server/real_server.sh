@@ -1,7 +1,8 @@
 #!/bin/bash
 # The tool's configuration served by a real Apache 2.4 through platform/apache
-# and reached by real clients, in a throw-away demo appliance (with one more
-# share whose name the configuration cannot carry).
+# and reached by real clients, in a throw-away demo appliance (with two more
+# shares whose names the configuration cannot carry: one would break the
+# file, one would name the server root).
 #   real_server.sh access|litmus|rclone|restarts|broken DAVSYNC
 # Status 77 (skipped) when not root.
 set -uo pipefail
@@ -12,7 +13,8 @@ port=$(free_port)
 root=$(appliance_new "$2" "$port")
 work=$(mktemp -d)
 trap 'rm -rf "$work"; appliance_remove "$root" || exit 1' EXIT
-demo_appliance "$root" 'Say"Hi|/mnt/HD/HD_a2/SayHi||||yes|' 'Say"Hi|/SayHi|1|1'
+demo_appliance "$root" $'Say"Hi|/mnt/HD/HD_a2/SayHi||||yes|\n../../..|/mnt/HD/HD_a2/Up||||yes|' \
+    $'Say"Hi|/SayHi|1|1\n../../..|/Up|1|1'
 url=http://127.0.0.1:$port
 conf=$root$appliance_server_root/conf/extra/httpd-dav.conf
 failures=0
