@@ -1,0 +1,21 @@
+// Only what the installed binary cannot show: no share text that reaches the
+// shell escaping is long enough to meet its limit, and nothing in the tool
+// calls the exported itoa.
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "output/shell_escape.h"
+
+extern "C" char *itoa(int value);
+
+TEST(EscapeForShell, TakesFiveHundredTwelveCharactersAndRefusesMore) {
+    std::string out(2048, '\0');
+    EXPECT_EQ(escape_for_shell(std::string(512, ';').c_str(), &out[0]), 0);
+    EXPECT_EQ(std::string(out.c_str()).size(), 1024u);
+    testing::internal::CaptureStdout();
+    EXPECT_EQ(escape_for_shell(std::string(513, 'a').c_str(), &out[0]), -1);
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "Can't process string lenghth bigger than 512.\n");
+}
+
+TEST(Itoa, FormatsSignedDecimal) { EXPECT_STREQ(itoa(-2147483647 - 1), "-2147483648"); }
