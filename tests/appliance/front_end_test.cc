@@ -1,125 +1,70 @@
-// The command front end seen from outside: which calls are refused with the
-// usage text, which run, which do nothing. Also checks the harness itself.
-#include <gtest/gtest.h>
+// The command front end seen from outside, and the harness itself.
+#include <csignal>
+#include <filesystem>
 
-#include <string>
-#include <sys/stat.h>
-#include <vector>
+#include "appliance/fixture.h"
 
-#include "harness/appliance.h"
+using namespace fixture;
 
 namespace {
 
-using Words = std::vector<std::string>;
-
 const char USAGE[] =
-    "Error usage.\n"
-    "Please give me :\n"
-    "\t\"do    \" - add config from xml info.\n"
-    "\t\"del   \" - delete setting by xml info.\n"
-    "\t\"du    \" - delete user from xml info.\n"
-    "\t\"get   \" - get share volume.\n"
-    "\t\"merge \" - merge webdav setting from xml info.\n"
-    "\t\"start \" - merge config and restart lighty.\n"
-    "\t\"stop  \" - stop webdav function.\n"
-    "\t\"p2pen \" - start p2p webdav share.\n"
-    "\t\"amulen\" - start amule webdav share.\n"
+    "Error usage.\nPlease give me :\n\t\"do    \" - add config from xml info.\n"
+    "\t\"del   \" - delete setting by xml info.\n\t\"du    \" - delete user from xml info.\n"
+    "\t\"get   \" - get share volume.\n\t\"merge \" - merge webdav setting from xml info.\n"
+    "\t\"start \" - merge config and restart lighty.\n\t\"stop  \" - stop webdav function.\n"
+    "\t\"p2pen \" - start p2p webdav share.\n\t\"amulen\" - start amule webdav share.\n"
     "\t\"chg\"    - change folder real link.\n";
 
-std::string describe(const Words &words) {
-    std::string text = "davsync";
-    for (const std::string &word : words) text += " [" + word.substr(0, 40) + "]";
-    return text;
-}
+struct Call { Words words; int status; bool usage; Words server_calls; };
 
-class FrontEnd : public ::testing::Test {
-protected:
-    appliance::Appliance box;
+const std::string x1023(1023, 'x'), x1024(1024, 'x'), x12797(12797, 'x'), x12798(12798, 'x');
 
-    // One volume with one published share, so a command that runs is seen
-    // by its server call.
-    void SetUp() override {
-        box.mount("/mnt/HD/HD_a2");
-        box.make_dir("/mnt/HD/HD_a2/Public");
-        box.set_catalogue({{"Public", "/mnt/HD/HD_a2/Public", "", "", "", "yes", ""}});
-        box.write_share_list("/mnt/HD/HD_a2", {{"Public", "/Public", 1, 1}});
-    }
-
-    // Nothing ran: no server call, nothing left in /tmp, no configuration.
-    void expect_untouched(const Words &words) {
-        EXPECT_TRUE(box.apache_calls().empty()) << describe(words);
-        EXPECT_TRUE(box.list_dir("/tmp").empty()) << describe(words);
-        EXPECT_TRUE(box.list_dir("/usr/local/apache2_dav/conf/extra").empty()) << describe(words);
-    }
+// Word counts, prefixes, and the widths of decoded and "#user#" arguments.
+const Call CALLS[] = {
+    {{}, 255, true}, {{"frobnicate"}, 255, true}, {{"START"}, 255, true}, {{""}, 255, true},
+    {{"get"}, 255, true}, {{"get", "a", "b"}, 255, true}, {{"du"}, 255, true}, {{"du", "a", "b"}, 255, true},
+    {{"del"}, 255, true}, {{"deluser", "a", "b"}, 255, true}, {{"stop", "now"}, 255, true},
+    {{"reset", "all"}, 255, true}, {{"do"}, 255, true}, {{"merge", "a", "b"}, 255, true},
+    {{"p2pen", "x"}, 255, true}, {{"amulen", "x"}, 255, true}, {{"chg", "/a"}, 255, true},
+    {{"chg", "/a", "/b", "/c"}, 255, true}, {{"chgx", "/a", "/b"}, 255, true},
+    {{"get", x1024}, 255, true}, {{"del", x12798 + "xx"}, 255, true}, {{"du", x12798}, 255, true},
+    {{"gu"}, 0, false}, {{"guest", "a", "b", "c"}, 0, false}, {{"reset"}, 0, false},
+    {{"do", "/tmp/none.xml"}, 255, false}, {{"merge", "/tmp/none.xml"}, 255, false},
+    {{"get", x1023}, 0, false}, {{"du", x12797}, 0, false, {"restart dav"}},
+    {{"start", "x", "y"}, 0, false, {"restart dav"}}, {{"starter"}, 0, false, {"restart dav"}},
 };
 
-TEST_F(FrontEnd, BadCallsPrintTheUsageAndExit255) {
-    const std::string too_long(12800, 'a');
-    const Words calls[] = {
-        {},
-        {"frobnicate"},
-        {"START"},
-        {""},
-        {"get"}, {"get", "a", "b"},
-        {"du"}, {"du", "a", "b"},
-        {"del"}, {"deluser", "a", "b"},
-        {"stop", "now"},
-        {"reset", "all"},
-        {"do"}, {"do", "a", "b"},
-        {"merge"}, {"merge", "a", "b"},
-        {"p2pen", "x"},
-        {"amulen", "x"},
-        {"chg"}, {"chg", "/a"}, {"chg", "/a", "/b", "/c"}, {"chgx", "/a", "/b"},
-        {"get", too_long}, {"del", too_long}, {"du", too_long},
-    };
-    for (const Words &words : calls) {
-        appliance::RunResult result = box.run(words);
-        EXPECT_EQ(result.status, 255) << describe(words) << "\n" << result.err;
-        EXPECT_EQ(result.out, USAGE) << describe(words);
-        expect_untouched(words);
-    }
-}
-
-// gu and reset alone do nothing; any word beginning with "start" runs start
-// and the rest is ignored; do and merge of an unreadable file exit silently.
-TEST_F(FrontEnd, CallsThatPrintNothing) {
-    struct { Words words; int status; Words calls; } cases[] = {
-        {{"gu"}, 0, {}}, {{"guest"}, 0, {}}, {{"gu", "a", "b", "c"}, 0, {}}, {{"reset"}, 0, {}},
-        {{"do", "/tmp/no_such_list.xml"}, 255, {}}, {{"merge", "/tmp/no_such_list.xml"}, 255, {}},
-        {{"start", "x", "y"}, 0, {"restart dav"}}, {{"starter"}, 0, {"restart dav"}},  // last: they write
-    };
-    for (const auto &c : cases) {
+TEST(FrontEnd, WordsDecideWhatRuns) {
+    Appliance box;
+    realistic(box);
+    for (const Call &call : CALLS) {
+        SCOPED_TRACE((call.words.empty() ? "" : call.words[0]) + " and " +
+                     std::to_string(call.words.size()) + " words");
         box.remove("/var/log/apache_calls");
-        appliance::RunResult result = box.run(c.words);
-        EXPECT_EQ(result.status, c.status) << describe(c.words) << "\n" << result.err;
-        EXPECT_EQ(result.out + result.err, "") << describe(c.words);
-        if (c.calls.empty()) expect_untouched(c.words);
-        else EXPECT_EQ(box.apache_calls(), c.calls) << describe(c.words);
+        RunResult run = box.run(call.words);
+        EXPECT_EQ(run.status, call.status) << run.err;
+        EXPECT_EQ(run.out + run.err, call.usage ? USAGE : "");
+        EXPECT_EQ(box.apache_calls(), call.server_calls);
     }
 }
 
-// The harness: a program sees PATH alone, and the root disappears with the
-// Appliance while the host's /usr/local stays as it was.
-TEST(Harness, RunsInsideTheRootAndCleansUp) {
+// Also what later tests rely on: a full tmpfs, a planted FIFO, a run killed with its shells.
+TEST(Harness, IsolatesEachRunAndLeavesNothingBehind) {
     std::string root;
     {
-        appliance::Appliance box;
-        root = box.root();
-        appliance::RunResult env = box.run_program("/usr/bin/env", {});
-        EXPECT_EQ(env.out,
+        Appliance box;
+        root = box.host("");
+        EXPECT_EQ(box.run({}, {{}, 0, "/usr/bin/env"}).out,
                   "PATH=/opt/recorder:/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin\n");
-
-        appliance::RunResult write =
-            box.run_program("/bin/sh", {"-c", "mkdir -p /usr/local/harness_probe && apache restart dav"});
-        EXPECT_EQ(write.status, 0) << write.err;
-        EXPECT_TRUE(box.exists("/usr/local/harness_probe"));
-        EXPECT_EQ(box.apache_calls(), Words{"restart dav"});
-        EXPECT_NE(box.run_program("/bin/sh", {"-c", "touch /usr/bin/harness_probe"}).status, 0);
+        box.plant_fifo("/tmp/fifo");
+        RunResult sh = box.run({"-c", "test -p /tmp/fifo && touch /usr/bin/x; yes | head -c 99999 > /tmp/x"},
+                               {{{"/tmp", "16k"}}, 0, "/bin/sh"});
+        EXPECT_NE(sh.err.find("Read-only file system"), std::string::npos) << sh.err;
+        EXPECT_NE(sh.err.find("No space left on device"), std::string::npos) << sh.err;
+        EXPECT_EQ(box.run({"-c", "sleep 9 & sleep 9"}, {{}, 300, "/bin/sh"}).status, 128 + SIGKILL);
     }
-    struct stat st;
-    EXPECT_NE(lstat(root.c_str(), &st), 0) << root << " left behind";
-    EXPECT_NE(lstat("/usr/local/harness_probe", &st), 0);
-    EXPECT_NE(lstat("/usr/bin/harness_probe", &st), 0);
+    EXPECT_FALSE(std::filesystem::exists(root));
 }
 
 }  // namespace

@@ -1,0 +1,252 @@
+// What no user and no failing machine may make a run do: use something
+// planted where it writes, follow a link out of a USB volume, publish what
+// lies outside the volume folders, replace a list it could not read, store
+// or place what it did not finish, or lose an edit to another run.
+#include <cstdlib>
+#include <filesystem>
+#include <map>
+#include <random>
+
+#include "appliance/fixture.h"
+
+using namespace fixture;
+
+namespace {
+
+const std::string VICTIM = "/etc/victim";
+const std::string A2_LIST = A2 + "/.system_data/lighty.xml";
+// Every name the tool writes or opens in /tmp, the world-writable folder.
+const Words TMP_NAMES = {"/tmp/dav.conf", "/tmp/corvane.node", "/tmp/corvane_start_lock",
+                         "/tmp/set_webdav_note", "/tmp/lighty.xml", "/tmp/lighty_iso.xml", QUERY};
+
+// The stored lists and the placed configuration.
+Files stored(const Appliance &box) {
+    Files files = {{CONF, ""}};
+    for (const std::string &volume : {A2, B2, D2})
+        for (const std::string &list : {std::string("lighty.xml"), ISO}) files.push_back({volume + "/.system_data/" + list, ""});
+    for (auto &[path, text] : files) text = box.exists(path) ? box.read(path) : GONE;
+    return files;
+}
+
+// What a start on the realistic appliance leaves when nothing is in its way.
+const Files &clean_start() {
+    static const Files files = [] {
+        Appliance box;
+        realistic(box);
+        box.run({"start"});
+        return stored(box);
+    }();
+    return files;
+}
+
+RunOptions killed_after(int ms) {
+    RunOptions options;
+    options.kill_after_ms = ms;
+    return options;
+}
+
+void expect_quiet(const RunResult &run) {
+    EXPECT_EQ(run.status, 0) << run.err;
+    EXPECT_EQ(run.out + run.err, "");
+}
+
+TEST(Safety, NothingPlantedInTmpIsUsed) {
+    using Plant = std::function<void(Appliance &, const std::string &)>;
+    const std::vector<std::pair<const char *, Plant>> plants = {
+        {"link", [](Appliance &box, const std::string &at) { box.plant_link(VICTIM, at); }},
+        {"fifo", [](Appliance &box, const std::string &at) { box.plant_fifo(at); }},
+        {"folder", [](Appliance &box, const std::string &at) { box.make_dir(at + "/x"); }},
+        {"foreign file", [](Appliance &box, const std::string &at) { box.plant_foreign(at); }}};
+    for (const auto &[kind, plant] : plants) {
+        SCOPED_TRACE(kind);
+        Appliance box;
+        realistic(box);
+        box.write(VICTIM, "keep");
+        for (const std::string &name : TMP_NAMES) plant(box, name);
+        expect_quiet(box.run({"start"}));
+        expect_quiet(box.run({"get", A2 + "/Public"}));
+        expect_files(box, clean_start());
+        EXPECT_EQ(box.read(VICTIM), "keep");
+        if (std::string(kind) != "folder")
+            expect_files(box, {{"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE},
+                               {QUERY, "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n\t\t<item>\n"
+                                       "\t\t\t<shared_name>Public</shared_name>\n\t\t\t<path>" + A2 + "/Public</path>\n"
+                                       "\t\t\t<enable>1</enable>\n\t\t</item>\n\t</WebDAV>\n</config>\n"}});
+    }
+}
+
+// Input items whose path is no volume folder, or goes through a link on a
+// USB volume, change nothing but what the good item asks for.
+TEST(Safety, ItemsOutsideTheVolumeFoldersAndLinksOnAUsbVolumeAreNotFollowed) {
+    Appliance box;
+    realistic(box);
+    box.set_catalogue({{"Public", A2 + "/Public", "", "", "", "yes"}, {"Root", "/", "", "", "", "yes"}});
+    box.plant_link("/etc", "/mnt/USB/USB1/sub");
+    box.write("/etc/.davconf", "keep");
+    box.mount_usb("USB2", false);
+    box.plant_link(VICTIM, "/mnt/USB/USB2/.davconf");
+    box.write(VICTIM, "keep");
+    std::vector<ListItem> bad = {{"Root", "/"}, {"Root2", A2 + "/../../etc"}, {"Root3", "/etc"},
+                                 {"Root4", "/mnt/HD/HD_A2/x"}, {"Sub", "/mnt/USB/USB1/sub"},
+                                 {"Usb2", "/mnt/USB/USB2"}, {"Dot", A2 + "/./Public"}};
+    box.write("/tmp/in.xml", share_list_xml(1, bad));
+    expect_quiet(box.run({"do", "/tmp/in.xml"}));
+    expect_quiet(box.run({"del", "/mnt/USB/USB1/sub"}));
+    expect_files(box, {{"/etc/.davconf", "keep"}, {VICTIM, "keep"}});
+    EXPECT_EQ(box.read(CONF).find("Root"), std::string::npos);
+    expect_quiet(box.run({"chg", A2 + "/Public", "/"}));
+    EXPECT_NE(box.read(CONF).find(section("Public", "On", OPEN)), std::string::npos);
+}
+
+// A list the parser rejects stays byte for byte and its entries come back
+// once it reads again; a list whose layout is wrong is rewritten.
+TEST(Safety, AStoredListThatDoesNotParseIsKept) {
+    for (const std::string broken : {"", "<?xml version=\"1.0\"?>\n<config>\n\t<WebDAV>\n\t\t<count>2",
+                                     "\xff\xfe not xml"}) {
+        Appliance box;
+        realistic(box);
+        box.write(A2_LIST, broken);
+        expect_quiet(box.run({"start"}));
+        EXPECT_EQ(box.read(A2_LIST), broken);
+        EXPECT_EQ(box.read(CONF).find("Public"), std::string::npos);
+        box.write_list(A2, A2_ITEMS, 7);
+        expect_quiet(box.run({"start"}));
+        expect_files(box, clean_start());
+    }
+}
+
+// A catalogue name cut to the 255 bytes of an entry keeps whole characters,
+// so the list written from it is stored, and parses on the next run.
+TEST(Safety, ANameCutAtItsWidthStaysReadable) {
+    Appliance box;
+    realistic(box);
+    std::string e_acute_150;
+    for (int i = 0; i < 150; ++i) e_acute_150 += "\xc3\xa9";
+    box.set_catalogue({{e_acute_150, A2 + "/Public", "", "", "", "yes"}});
+    expect_quiet(box.run({"start"}));
+    expect_quiet(box.run({"start"}));
+    EXPECT_NE(box.read(A2_LIST).find("<shared_name>" + e_acute_150.substr(0, 254) + "</shared_name>"),
+              std::string::npos);
+}
+
+// With /tmp full the lists cannot be staged: none is stored in part, and the
+// configuration is complete.
+TEST(Safety, AFullTmpLosesNothingStored) {
+    Appliance box;
+    realistic(box);
+    Files before = stored(box);
+    before.erase(before.begin());  // no configuration yet
+    box.write("/tmp/filler", std::string(64 * 1024, 'f'));
+    RunOptions full_tmp;
+    full_tmp.tmpfs = {{"/tmp", "64k"}};
+    expect_quiet(box.run({"start"}, full_tmp));
+    expect_files(box, before);
+    EXPECT_EQ(box.read(CONF), clean_start()[0].second);
+}
+
+// Killed at any moment, a run leaves each list as it was or as a whole run
+// writes it, and the next start places a complete configuration.
+TEST(Safety, AKilledRunLeavesOldOrNewAndTheNextStartCompletes) {
+    int trials = getenv("DAVSYNC_KILL_TRIALS") ? atoi(getenv("DAVSYNC_KILL_TRIALS")) : 30;
+    std::mt19937 random(7);
+    Appliance box;
+    realistic(box);
+    const Files old = stored(box);
+    for (int trial = 0; trial < trials; ++trial) {
+        SCOPED_TRACE(trial);
+        for (size_t i = 1; i < old.size(); ++i) box.write(old[i].first, old[i].second);
+        box.run({"start"}, killed_after(static_cast<int>(random() % 120) + 1));
+        Files now = stored(box);
+        for (size_t i = 1; i < old.size(); ++i)
+            EXPECT_TRUE(now[i].second == old[i].second || now[i].second == clean_start()[i].second) << now[i].first;
+        expect_quiet(box.run({"start"}));
+        expect_files(box, clean_start());
+    }
+}
+
+TEST(Safety, ConcurrentRunsLoseNoEditAndLeaveNoMark) {
+    Appliance box;
+    realistic(box);
+    std::vector<Share> shares = realistic_shares();
+    std::vector<ListItem> added;
+    for (int i = 0; i < 32; ++i) {
+        std::string name = "New" + std::to_string(i);
+        shares.push_back({name, A2 + "/" + name, "", "", "", "yes"});
+        added.push_back({name, "/" + name});
+        box.write("/tmp/in" + std::to_string(i) + ".xml", share_list_xml(1, {{name, A2 + "/" + name}}));
+    }
+    publish(box, shares);
+    std::vector<pid_t> runs;
+    for (int i = 0; i < 32; ++i) runs.push_back(box.start({"do", "/tmp/in" + std::to_string(i) + ".xml"}));
+    for (const Words &words : {Words{"start"}, Words{"get", A2 + "/Public"}, Words{"del", B2 + "/Backup"},
+                               Words{"stop"}, Words{"du", "alice"}})
+        runs.push_back(box.start(words));
+    for (pid_t run : runs) expect_quiet(box.finish(run));
+    std::string list = box.read(A2_LIST);
+    for (const ListItem &item : added) EXPECT_NE(list.find("<path>" + item.path + "</path>"), std::string::npos);
+    expect_files(box, {{"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}});
+}
+
+// Every file of the root but those the tool writes: its type, size and time.
+std::map<std::string, std::string> outside_tool_files(const Appliance &box) {
+    namespace fs = std::filesystem;
+    std::map<std::string, std::string> files;
+    std::string root = box.host("");
+    for (const auto &entry : fs::recursive_directory_iterator(root)) {
+        std::string path = entry.path().string().substr(root.size());
+        if (path.rfind("/tmp/", 0) == 0 || path.rfind("/usr/local/apache2_dav/", 0) == 0 ||
+            path.find("/.system_data/") != std::string::npos || path.find("/.davconf") != std::string::npos ||
+            path == "/var/log/apache_calls")
+            continue;
+        auto status = entry.symlink_status();
+        files[path] = std::to_string(static_cast<int>(status.type())) +
+                      (fs::is_regular_file(status) ? " " + std::to_string(fs::file_size(entry.path())) + " " +
+                                                         std::to_string(fs::last_write_time(entry.path()).time_since_epoch().count())
+                                                   : "");
+    }
+    return files;
+}
+
+// Catalogues, lists, names and widths a user can shape: no run crashes,
+// hangs, prints, or writes anything but the tool's own files.
+TEST(Safety, HostileInputsTouchNothingButTheToolsFiles) {
+    std::string punctuation = "!\"#$%&'()*+,-./:;<=>?@[\\]^_`{|}~\t\n x";
+    std::string laughs = "<!DOCTYPE c [<!ENTITY a \"aaaaaaaaaa\">";
+    for (char level = 'b'; level <= 'k'; ++level)
+        laughs += std::string("<!ENTITY ") + level + " \"" + std::string(10, '&') + "\">";
+    const std::vector<std::pair<const char *, std::function<void(Appliance &)>>> inputs = {
+        {"empty catalogue", [](Appliance &box) { box.write("/var/www/xml/smb.xml", ""); }},
+        {"cut catalogue", [](Appliance &box) { box.write("/var/www/xml/smb.xml", catalogue_xml(realistic_shares()).substr(0, 99)); }},
+        {"20 MB list", [](Appliance &box) { box.set_catalogue({{"Public", A2 + "/Public", std::string(20 << 20, 'r')}}); }},
+        {"external entity", [](Appliance &box) {
+             box.write("/var/www/xml/smb.xml", "<!DOCTYPE c [<!ENTITY x SYSTEM \"file:///etc/victim\">]><c><samba><item>"
+                                                "<name>Public&x;</name><path>" + A2 + "/Public</path></item></samba></c>"); }},
+        {"exponential entities", [laughs](Appliance &box) { box.write(A2_LIST, laughs + "]><c><WebDAV><count>&k;</count></WebDAV></c>"); }},
+        {"names of every kind", [punctuation](Appliance &box) {
+             std::vector<Share> shares;
+             std::vector<ListItem> items;
+             for (const std::string &name : {punctuation, std::string(255, 'n'), std::string(256, 'n'),
+                                             std::string(254, 'n') + "\xc3\xa9", std::string("bad\xff\xfe")}) {
+                 shares.push_back({name, A2 + "/F" + std::to_string(shares.size()), "#" + name + "#"});
+                 items.push_back({name, "/F" + std::to_string(items.size())});
+             }
+             publish(box, shares);
+             box.write_list(A2, items);
+             box.write("/etc/shared_name", punctuation + " = USB1\n\xff\xfe = USB1\n");
+         }}};
+    for (const auto &[what, input] : inputs) {
+        SCOPED_TRACE(what);
+        Appliance box;
+        realistic(box);
+        box.write(VICTIM, "keep");
+        input(box);
+        box.write("/tmp/in.xml", share_list_xml(1, {{"Public", A2 + "/Public"}}));
+        auto before = outside_tool_files(box);
+        for (const Words &words : {Words{"start"}, Words{"do", "/tmp/in.xml"}, Words{"get", A2 + "/Public"}})
+            expect_quiet(box.run(words));
+        EXPECT_EQ(outside_tool_files(box), before);
+        EXPECT_EQ(box.read(CONF).find("keep"), std::string::npos);
+    }
+}
+
+}  // namespace
