@@ -72,6 +72,7 @@ TEST(Safety, ItemsOutsideTheVolumeFoldersAndLinksOnAUsbVolumeAreNotFollowed) {
     box.write("/etc/.davconf", "keep");
     box.mount_usb("USB2", false);
     box.plant_link(VICTIM, "/mnt/USB/USB2/.davconf");
+    box.plant_link("/etc", LINKS);  // emptying it would empty /etc
     box.write(VICTIM, "keep");
     box.write("/tmp/in.xml", share_list_xml(1, {{"Root", "/"}, {"Root2", A2 + "/../../etc"}, {"Root3", "/etc"},
                                                  {"Root4", "/mnt/HD/HD_A2/x"}, {"Sub", "/mnt/USB/USB1/sub"},
