@@ -40,17 +40,6 @@ int touch_own_file(const char *path) {
     return close(fd) == 0 ? result : -1;
 }
 
-static bool write_all(int fd, const char *data, size_t length) {
-    while (length > 0) {
-        ssize_t put = write(fd, data, length);
-        if (put < 0 && errno == EINTR) continue;
-        if (put <= 0) return false;
-        data += put;
-        length -= static_cast<size_t>(put);
-    }
-    return true;
-}
-
 // "<dir>/.<name>.XXXXXX": beside the target, so the rename stays on one
 // file system, and hidden from a reader of the folder.
 static int temporary_beside(char (&temporary)[4096], const char *path) {
@@ -60,21 +49,33 @@ static int temporary_beside(char (&temporary)[4096], const char *path) {
                              path + dir_length);
 }
 
-int replacement_write(Replacement *replacement, const char *path, const char *data,
-                      size_t length, mode_t mode) {
+FILE *replacement_open(Replacement *replacement, const char *path) {
     replacement->path = path;
     replacement->temporary[0] = '\0';
-    if (temporary_beside(replacement->temporary, path) != 0) return -1;
+    if (temporary_beside(replacement->temporary, path) != 0) return nullptr;
     int fd = mkostemp(replacement->temporary, O_CLOEXEC);
-    if (fd == -1) {
-        replacement->temporary[0] = '\0';
-        return -1;
-    }
-    bool written = write_all(fd, data, length) && fchmod(fd, mode) == 0 && fsync(fd) == 0;
-    written = close(fd) == 0 && written;
+    FILE *file = fd == -1 ? nullptr : fdopen(fd, "w");
+    if (file != nullptr) return file;
+    if (fd != -1) close(fd);
+    replacement_abandon(replacement);
+    return nullptr;
+}
+
+int replacement_close(Replacement *replacement, FILE *file, mode_t mode) {
+    bool written = fflush(file) == 0 && ferror(file) == 0 && fchmod(fileno(file), mode) == 0 &&
+                   fsync(fileno(file)) == 0;
+    written = fclose(file) == 0 && written;
     if (written) return 0;
     replacement_abandon(replacement);
     return -1;
+}
+
+int replacement_write(Replacement *replacement, const char *path, const char *data,
+                      size_t length, mode_t mode) {
+    FILE *file = replacement_open(replacement, path);
+    if (file == nullptr) return -1;
+    fwrite(data, 1, length, file);
+    return replacement_close(replacement, file, mode);
 }
 
 int replacement_commit(Replacement *replacement) {

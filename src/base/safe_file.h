@@ -22,11 +22,15 @@ int touch_own_file(const char *path);
 // new hidden file beside it, synced, then renamed over it. -1 when any step
 // fails; the old file is then untouched.
 [[nodiscard]] int replace_file(const char *path, const char *data, size_t length, mode_t mode);
-// The same in two steps, for a caller with work to do between them.
+// The same in steps, for a caller that writes a stream or has work to do
+// before the rename: open, write, close (flushed and synced; -1 and
+// abandoned when anything failed), then commit or abandon.
 struct Replacement {
     char temporary[4096];
     const char *path;
 };
+[[nodiscard]] FILE *replacement_open(Replacement *replacement, const char *path);
+[[nodiscard]] int replacement_close(Replacement *replacement, FILE *file, mode_t mode);
 [[nodiscard]] int replacement_write(Replacement *replacement, const char *path, const char *data,
                                     size_t length, mode_t mode);
 [[nodiscard]] int replacement_commit(Replacement *replacement);

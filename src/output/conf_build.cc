@@ -12,9 +12,15 @@ int conf_build_open(ConfBuild *build) {
     group_table_init(&build->groups);
     build->published = new_path_node();
     build->published_tail = build->published;
-    int conf = memory_file_open(&build->conf);
+    // Under the node lock, a temporary file of ours can only be a killed run's.
+    remove_stale_replacements(PLACED_CONF_FILE);
+    remove_stale_replacements(NOTE_FILE);
+    build->conf = replacement_open(&build->conf_file, PLACED_CONF_FILE);
     int note = memory_file_open(&build->note);
-    if (build->published != nullptr && conf == 0 && note == 0) return 0;
+    if (build->published != nullptr && build->conf != nullptr && note == 0) {
+        setvbuf(build->conf, build->conf_buffer, _IOFBF, sizeof build->conf_buffer);
+        return 0;
+    }
     conf_build_free(build);
     return -1;
 }
@@ -44,22 +50,18 @@ static void place_note(ConfBuild *build) {
 }
 
 int conf_build_place(ConfBuild *build) {
-    // Under the node lock, a temporary file of ours can only be a killed run's.
-    remove_stale_replacements(PLACED_CONF_FILE);
-    remove_stale_replacements(NOTE_FILE);
-    int conf_closed = memory_file_close(&build->conf);
-    int note_closed = memory_file_close(&build->note);
-    Replacement conf;
-    if (conf_closed != 0 || note_closed != 0 ||
-        replacement_write(&conf, PLACED_CONF_FILE, build->conf.text, build->conf.length, 0644) != 0)
-        return -1;
+    int conf_closed = replacement_close(&build->conf_file, build->conf, 0644);
+    build->conf = nullptr;
+    if (memory_file_close(&build->note) != 0 || conf_closed != 0) return -1;
     sync_link_dir(build->links);
     place_note(build);
-    return replacement_commit(&conf);
+    return replacement_commit(&build->conf_file);
 }
 
 void conf_build_free(ConfBuild *build) {
-    memory_file_free(&build->conf);
+    if (build->conf != nullptr) fclose(build->conf);
+    build->conf = nullptr;
+    replacement_abandon(&build->conf_file);
     memory_file_free(&build->note);
     free_path_list(build->published);
     free_link_requests(build->links);

@@ -1,8 +1,8 @@
-// What one regeneration run writes for the server, built whole in memory
-// first: the configuration text, the note file text, the names already
-// published and the links to make. Only a complete build is placed; a build
-// that failed anywhere leaves the placed configuration, the note file and
-// the link directory as they were.
+// What one regeneration run writes for the server, built whole first: the
+// configuration text (in a new file beside its place), the note file text
+// (in memory), the names already published and the links to make. Only a
+// complete build is placed; a build that failed anywhere leaves the placed
+// configuration, the note file and the link directory as they were.
 #ifndef DAVSYNC_OUTPUT_CONF_BUILD_H
 #define DAVSYNC_OUTPUT_CONF_BUILD_H
 
@@ -13,7 +13,9 @@
 #include "shares/path_list.h"
 
 struct ConfBuild {
-    MemoryFile conf;
+    Replacement conf_file;
+    FILE *conf;  // into conf_file
+    char conf_buffer[1 << 16];  // fewer writes for a file of many megabytes
     MemoryFile note;
     bool note_wanted;     // false: the note file is removed when placed
     PathNode *published;  // shared names that have a section already
@@ -28,10 +30,9 @@ struct ConfBuild {
 // Registers a shared name for a section: 0 when it was not published yet,
 // -1 when it was (or does not fit a path list node, or memory runs out).
 int publish_name(ConfBuild *build, const char *shared_name);
-// Writes the configuration beside its place, brings the link directory in
-// line, writes or removes the note file, then renames the configuration
-// into place. -1 when the build or the configuration's writing failed:
-// nothing was changed then.
+// Syncs the configuration, brings the link directory in line, writes or
+// removes the note file, then renames the configuration into place. -1 when
+// the build or the configuration's writing failed: nothing was changed then.
 int conf_build_place(ConfBuild *build);
 void conf_build_free(ConfBuild *build);
 

@@ -40,28 +40,30 @@ static void index_names(NameIndex *index, NameNode *names) {
         if (node->name[0] != '\0') (void)name_index_add(index, node->name, node);
 }
 
-// A user line has the width of a line buffer. Each name is followed by one
-// space; names that no longer fit are left off, the line stops at the last
-// one that does.
+// Appends a name and its space at `used`; false, leaving the line as it
+// was, when they do not fit.
+static bool append_user(char (&line)[LINE_BUFFER_WIDTH], size_t *used, const char *name) {
+    size_t length = strlen(name);
+    if (*used + length + 1 > sizeof line - 1) return false;
+    memcpy(line + *used, name, length);
+    line[*used + length] = ' ';
+    *used += length + 1;
+    return true;
+}
+
+// Each name is followed by one space; names that no longer fit the line are
+// left off, the line stops at the last one that does.
 static void write_user_line(FILE *conf, const NameNode *first, const NameNode *second) {
-    static const char START[] = "\t\tRequire user ";
-    fputs(START, conf);
-    size_t used = sizeof START - 1;
+    char line[LINE_BUFFER_WIDTH];
+    size_t used = 0;
+    append_user(line, &used, "\t\tRequire user");
     const NameNode *lists[] = {first, second};
-    for (const NameNode *list : lists) {
-        for (const NameNode *node = list; node != nullptr; node = node->next) {
-            if (node->name[0] == '\0') continue;
-            size_t piece = strlen(node->name) + 1;
-            if (used + piece > LINE_BUFFER_WIDTH - 1) {
-                fputc('\n', conf);
-                return;
-            }
-            fputs(node->name, conf);
-            fputc(' ', conf);
-            used += piece;
-        }
-    }
-    fputc('\n', conf);
+    bool full = false;
+    for (const NameNode *list : lists)
+        for (const NameNode *node = list; node != nullptr && !full; node = node->next)
+            full = node->name[0] != '\0' && !append_user(line, &used, node->name);
+    line[used] = '\n';
+    fwrite(line, 1, used + 1, conf);
 }
 
 static void write_authenticated_block(FILE *conf, GroupTable *groups, const ShareRecord *rules) {

@@ -23,7 +23,7 @@ static void write_entry(ConfBuild *build, int webdav_enable, const DavShareEntry
     if (publish_name(build, entry->shared_name) < 0) return;
     const ShareRecord *share = find_entry_share(catalogue, entry, true);
     if (share == nullptr) return;
-    write_share_section(build->conf.stream, &build->groups, entry->shared_name,
+    write_share_section(build->conf, &build->groups, entry->shared_name,
                         webdav_enable != 0 && entry->enable != 0, share);
     // The link points at the entry's own path, not the share's.
     if ((webdav_enable & entry->enable) != 0)
@@ -32,7 +32,7 @@ static void write_entry(ConfBuild *build, int webdav_enable, const DavShareEntry
 
 void write_dav_conf(ConfBuild *build, int webdav_enable, const DavShareEntry *entries,
                     const ShareLookup *catalogue) {
-    write_header(build->conf.stream);
+    write_header(build->conf);
     for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next)
         write_entry(build, webdav_enable, entry, catalogue);
 }

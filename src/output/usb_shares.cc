@@ -97,13 +97,13 @@ static void find_shared_name(const char *volume, char (&name)[SHARED_NAME_WIDTH]
 static void write_volume_section(ConfBuild *build, const char *volume, const char *shared_name) {
     char catalogue_path[FILE_LINE_WIDTH];
     if (!volume_file_path(volume, ".smbm.xml", catalogue_path) || !has_file(volume, ".smbm.xml")) {
-        write_share_section(build->conf.stream, &build->groups, shared_name, true, nullptr);
+        write_share_section(build->conf, &build->groups, shared_name, true, nullptr);
         return;
     }
     ShareRecord *rules = new_share_record();
     if (rules == nullptr) return;
     read_share_catalogue_file(rules, catalogue_path);
-    write_share_section(build->conf.stream, &build->groups, shared_name, true, rules);
+    write_share_section(build->conf, &build->groups, shared_name, true, rules);
     free_share_catalogue(rules);
 }
 
