@@ -74,13 +74,11 @@ inline void publish(Appliance &box, const std::vector<Share> &shares) {
     for (const Share &share : shares) box.make_dir(share.path);
 }
 inline void realistic(Appliance &box) {
-    for (const std::string &volume : {A2, B2, D2}) box.mount(volume);
+    for (const auto &[volume, items] : {std::make_pair(A2, A2_ITEMS), {B2, B2_ITEMS}, {D2, D2_ITEMS}})
+        box.mount(volume), box.write_list(volume, items, 7);
+    box.write_list(A2, ISO_ITEMS, 7, ISO);
     box.add_group("staff", {"bob", "carol"});
     publish(box, realistic_shares());
-    box.write_list(A2, A2_ITEMS, 7);
-    box.write_list(B2, B2_ITEMS, 7);
-    box.write_list(D2, D2_ITEMS, 7);
-    box.write_list(A2, ISO_ITEMS, 7, ISO);
     box.mount_usb("USB1");
     box.write("/etc/shared_name", "usbdisk1 = USB1\n");
 }

@@ -39,8 +39,7 @@ TEST(FrontEnd, WordsDecideWhatRuns) {
     Appliance box;
     realistic(box);
     for (const Call &call : CALLS) {
-        SCOPED_TRACE((call.words.empty() ? "" : call.words[0]) + " and " +
-                     std::to_string(call.words.size()) + " words");
+        SCOPED_TRACE(testing::PrintToString(call.words).substr(0, 60));
         box.remove("/var/log/apache_calls");
         RunResult run = box.run(call.words);
         EXPECT_EQ(run.status, call.status) << run.err;

@@ -115,8 +115,8 @@ void Appliance::make_dir(const std::string &inside) { fs::create_directories(hos
 void Appliance::remove(const std::string &inside) { fs::remove_all(host(inside)); }
 
 std::string Appliance::link_target(const std::string &inside) const {
-    std::error_code error;  // none: not a link
-    return fs::read_symlink(host(inside), error).string();
+    std::error_code not_a_link;
+    return fs::read_symlink(host(inside), not_a_link).string();
 }
 
 std::vector<std::string> Appliance::list(const std::string &inside) const {

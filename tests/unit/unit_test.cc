@@ -1,10 +1,14 @@
 // Only what the installed binary cannot show: nothing in the tool escapes
-// for the shell any more or calls the exported itoa.
+// for the shell any more or calls the exported itoa, and the tool ignores
+// what the volume library answers.
 #include <gtest/gtest.h>
 
+#include <filesystem>
+#include <fstream>
 #include <string>
 
 #include "output/shell_escape.h"
+#include "platform/volume_lib.h"
 
 extern "C" char *itoa(int value);
 
@@ -19,3 +23,12 @@ TEST(EscapeForShell, TakesFiveHundredTwelveCharactersAndRefusesMore) {
 }
 
 TEST(Itoa, FormatsSignedDecimal) { EXPECT_STREQ(itoa(-2147483647 - 1), "-2147483648"); }
+
+TEST(VolumeLibrary, SaysWhetherTheCopyWasStored) {
+    char volume[] = "/tmp/volume_lib_test.XXXXXX";
+    ASSERT_NE(mkdtemp(volume), nullptr);
+    std::ofstream(std::string(volume) + "/lighty.xml") << "list";
+    EXPECT_EQ(saveDataToHiddenByVolume((std::string(volume) + "/lighty.xml").c_str(), volume), 0);
+    EXPECT_EQ(saveDataToHiddenByVolume((std::string(volume) + "/missing.xml").c_str(), volume), -1);
+    std::filesystem::remove_all(volume);
+}
