@@ -34,10 +34,7 @@ const Files &clean_start() {
     return files;
 }
 
-void expect_quiet(const RunResult &run) {
-    EXPECT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(run.out + run.err, "");
-}
+void expect_quiet(const RunResult &run) { EXPECT_EQ(std::to_string(run.status) + run.out + run.err, "0"); }
 
 TEST(Safety, NothingPlantedInTmpIsUsed) {
     using Plant = std::function<void(Appliance &, const std::string &)>;
@@ -56,9 +53,9 @@ TEST(Safety, NothingPlantedInTmpIsUsed) {
         expect_quiet(box.run({"get", A2 + "/Public"}));
         expect_files(box, clean_start());
         EXPECT_EQ(box.read(VICTIM), "keep");
-        if (std::string(kind) != "folder")  // what cannot be removed stays; the run goes on without it
-            expect_files(box, {{"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}});
-        if (std::string(kind) != "folder") EXPECT_NE(box.read(QUERY).find("<shared_name>Public<"), std::string::npos);
+        if (std::string(kind) == "folder") continue;  // what cannot be removed stays; runs go on without it
+        expect_files(box, {{"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}});
+        EXPECT_NE(box.read(QUERY).find("<shared_name>Public<"), std::string::npos);
     }
 }
 
@@ -208,17 +205,9 @@ TEST(Safety, HostileInputsTouchNothingButTheToolsFiles) {
                                                 "<name>Public&x;</name><path>" + A2 + "/Public</path></item></samba></c>"); }},
         {"exponential entities", [laughs](Appliance &box) { box.write(A2_LIST, laughs + "]><c><WebDAV><count>&k;</count></WebDAV></c>"); }},
         {"names of every kind", [punctuation](Appliance &box) {
-             std::vector<Share> shares;
-             std::vector<ListItem> items;
-             for (const std::string &name : {punctuation, std::string(255, 'n'), std::string(256, 'n'),
-                                             std::string(254, 'n') + "\xc3\xa9", std::string("bad\xff\xfe")}) {
-                 shares.push_back({name, A2 + "/F" + std::to_string(shares.size()), "#" + name + "#"});
-                 items.push_back({name, "/F" + std::to_string(items.size())});
-             }
-             publish(box, shares);
-             box.write_list(A2, items);
-             box.write("/etc/shared_name", punctuation + " = USB1\n\xff\xfe = USB1\n");
-         }}};
+             publish(box, {{punctuation, A2 + "/P", "#" + punctuation + "#"}, {std::string(256, 'n'), A2 + "/N"}});
+             box.write_list(A2, {{punctuation, "/P"}, {std::string(256, 'n'), "/N"}, {"bad\xff\xfe", "/P"}});
+             box.write("/etc/shared_name", punctuation + " = USB1\n\xff\xfe = USB1\n"); }}};
     for (const auto &[what, input] : inputs) {
         SCOPED_TRACE(what);
         Appliance box;
