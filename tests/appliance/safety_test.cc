@@ -99,7 +99,7 @@ TEST(Safety, AStoredListThatDoesNotParseIsKept) {
 }
 
 // A catalogue name cut to the 255 bytes of an entry keeps whole characters,
-// so the list written from it is stored, and parses on the next run.
+// so the list written from it parses and is stored.
 TEST(Safety, ANameCutAtItsWidthStaysReadable) {
     Appliance box;
     realistic(box);
@@ -107,20 +107,22 @@ TEST(Safety, ANameCutAtItsWidthStaysReadable) {
     while (e_acute_150.size() < 300) e_acute_150 += "\xc3\xa9";
     box.set_catalogue({{e_acute_150, A2 + "/Public", "", "", "", "yes"}});
     expect_quiet(box.run({"start"}));
-    expect_quiet(box.run({"start"}));
     EXPECT_NE(box.read(A2_LIST).find("<shared_name>" + e_acute_150.substr(0, 254) + "<"), std::string::npos);
 }
 
-// With /tmp full the lists cannot be staged: none is stored in part, and the
-// configuration is complete.
-TEST(Safety, AFullTmpLosesNothingStored) {
+// With /tmp full the lists cannot be staged, with a volume full they cannot
+// be stored: none is stored in part, and the configuration is complete.
+TEST(Safety, AFullTmpOrVolumeLosesNothingStored) {
     Appliance box;
     realistic(box);
     Files before = stored(box);
     before.erase(before.begin());  // no configuration yet
-    box.write("/tmp/filler", std::string(64 * 1024, 'f'));
+    box.write("/tmp/filler", std::string(64 * 1024, 'f')), box.write(B2 + "/filler", std::string(64 * 1024, 'f'));
     expect_quiet(box.run({"start"}, RunOptions{{{"/tmp", "64k"}}}));
     expect_files(box, before);
+    EXPECT_EQ(box.read(CONF), clean_start()[0].second);
+    box.remove(CONF);
+    expect_quiet(box.run({"start"}, RunOptions{{{B2, "64k"}}}));
     EXPECT_EQ(box.read(CONF), clean_start()[0].second);
 }
 
@@ -133,12 +135,11 @@ TEST(Safety, AKilledRunLeavesOldOrNewAndTheNextStartCompletes) {
     realistic(box);
     const Files old = stored(box);
     for (int trial = 0; trial < trials; ++trial) {
-        SCOPED_TRACE(trial);
-        for (size_t i = 1; i < old.size(); ++i) box.write(old[i].first, old[i].second);
+        for (size_t i = 1; i < old.size(); ++i) old[i].second == GONE ? box.remove(old[i].first) : box.write(old[i].first, old[i].second);
         box.run({"start"}, RunOptions{{}, static_cast<int>(random() % 120) + 1});
         Files now = stored(box);
         for (size_t i = 1; i < old.size(); ++i)
-            EXPECT_TRUE(now[i].second == old[i].second || now[i].second == clean_start()[i].second) << now[i].first;
+            EXPECT_TRUE(now[i].second == old[i].second || now[i].second == clean_start()[i].second) << now[i].first << trial;
         expect_quiet(box.run({"start"}));
         expect_files(box, clean_start());
     }
@@ -188,7 +189,6 @@ TEST(Safety, HostileInputsTouchNothingButTheToolsFiles) {
     for (char level = 'b'; level <= 'k'; ++level)
         laughs += std::string("<!ENTITY ") + level + " \"" + std::string(10, '&') + "\">";
     const std::vector<std::pair<const char *, std::function<void(Appliance &)>>> inputs = {
-        {"cut catalogue", [](Appliance &box) { box.write("/var/www/xml/smb.xml", catalogue_xml(realistic_shares()).substr(0, 99)); }},
         {"20 MB list", [](Appliance &box) { box.set_catalogue({{"Public", A2 + "/Public", std::string(20 << 20, 'r')}}); }},
         {"external entity", [](Appliance &box) {
              box.write("/var/www/xml/smb.xml", "<!DOCTYPE c [<!ENTITY x SYSTEM \"file:///etc/victim\">]><c><samba><item>"
