@@ -26,15 +26,6 @@ int copy_text_field(char *field, size_t width, const char *text) {
     return copy_text_prefix(field, width, text, width);
 }
 
-int append_text_field(char *field, size_t width, const char *text) {
-    if (field == nullptr || width == 0) return -1;
-    size_t used = strnlen(field, width - 1);
-    size_t length = strlen(text);
-    if (length > width - 1 - used) return -1;
-    memcpy(field + used, text, length + 1);
-    return 0;
-}
-
 int format_text_field(char *field, size_t width, const char *format, ...) {
     if (field == nullptr || width == 0) return -1;
     va_list args;

@@ -11,9 +11,6 @@
 int copy_text_field(char *field, size_t width, const char *text);
 // Copies at most `count` characters of `text`.
 int copy_text_prefix(char *field, size_t width, const char *text, size_t count);
-// Appends `text` behind the text already in the field; on -1 the field is
-// left exactly as it was (nothing partial is appended).
-int append_text_field(char *field, size_t width, const char *text);
 // printf into the field; on -1 the field holds nothing usable.
 int format_text_field(char *field, size_t width, const char *format, ...)
     __attribute__((format(printf, 3, 4)));
@@ -21,9 +18,6 @@ int format_text_field(char *field, size_t width, const char *format, ...)
 // Width taken from the array type, so a caller cannot pass a wrong one.
 template <size_t N> int copy_text(char (&field)[N], const char *text) {
     return copy_text_field(field, N, text);
-}
-template <size_t N> int append_text(char (&field)[N], const char *text) {
-    return append_text_field(field, N, text);
 }
 
 #endif
