@@ -1,9 +1,12 @@
 #include "shares/dav_share_list.h"
 
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <libxml/parser.h>
+#include <libxml/xmlreader.h>
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -48,53 +51,181 @@ void read_item(DavShareEntry *entry, xmlNode *item, const char *prefix) {
     *entry = read;
 }
 
-// Every child of the list element is read as an item; a new entry is
-// started only once the current one has a shared_name. -1 when memory runs out.
-int read_items(DavShareEntry *entry, xmlNode *list, const char *prefix) {
+// A list file is read by a streaming reader: only the child of the list
+// element in hand is a tree in memory, however long the list. The file is
+// still read to its end, and one that is not well-formed is refused whole.
+struct ListReader {
+    xmlTextReader *reader;
+    int status;  // of the last move: 1 on a node, 0 at the end, -1 on an error
+    int fd;
+    bool at_nul;
+};
+
+// The list element is the root's first child, its children the items.
+constexpr int ITEM_DEPTH = 2;
+
+// A NUL byte ends the text, as it does for the tree parser: a file padded
+// with NULs after its root element still reads.
+int read_until_nul(void *context, char *buffer, int length) {
+    ListReader *list = static_cast<ListReader *>(context);
+    if (list->at_nul) return 0;
+    ssize_t got;
+    do {
+        got = read(list->fd, buffer, static_cast<size_t>(length));
+    } while (got < 0 && errno == EINTR);
+    if (got <= 0) return static_cast<int>(got);
+    const void *nul = memchr(buffer, '\0', static_cast<size_t>(got));
+    if (nul == nullptr) return static_cast<int>(got);
+    list->at_nul = true;
+    return static_cast<int>(static_cast<const char *>(nul) - buffer);
+}
+
+int close_list_file(void *context) { return close(static_cast<ListReader *>(context)->fd); }
+
+bool open_list_reader(ListReader *list, const char *path) {
+    quiet_xml_errors();
+    list->reader = nullptr;
+    list->status = -1;
+    list->at_nul = false;
+    list->fd = open(path, O_RDONLY | O_CLOEXEC);
+    if (list->fd < 0) return false;
+    // The reader closes the file, also when it cannot be made. The text is
+    // read as UTF-8 whatever its declaration says.
+    list->reader = xmlReaderForIO(read_until_nul, close_list_file, list, path, "UTF-8",
+                                  XML_PARSE_NODICT | XML_PARSE_NOBLANKS | XML_PARSE_IGNORE_ENC);
+    if (list->reader != nullptr) list->status = 1;
+    return list->reader != nullptr;
+}
+
+bool move_on(ListReader *list) {
+    list->status = xmlTextReaderRead(list->reader);
+    return list->status == 1;
+}
+
+// From an element's start to its first child; false when it has none, or
+// the node in hand is no element.
+bool enter(ListReader *list) {
+    xmlTextReader *reader = list->reader;
+    int depth = xmlTextReaderDepth(reader);
+    if (xmlTextReaderNodeType(reader) != XML_READER_TYPE_ELEMENT ||
+        xmlTextReaderIsEmptyElement(reader) == 1)
+        return false;
+    return move_on(list) && xmlTextReaderDepth(reader) > depth;
+}
+
+// To the first item; false for a file whose list has none.
+bool enter_list(ListReader *list) {
+    while (move_on(list) && xmlTextReaderNodeType(list->reader) != XML_READER_TYPE_ELEMENT) {
+    }
+    return list->status == 1 && enter(list) && enter(list);
+}
+
+// The item in hand as a whole tree; null once the list has ended.
+xmlNode *item_in_hand(ListReader *list) {
+    if (list->status != 1 || xmlTextReaderDepth(list->reader) != ITEM_DEPTH) return nullptr;
+    return xmlTextReaderExpand(list->reader);
+}
+
+void next_item(ListReader *list) { list->status = xmlTextReaderNext(list->reader); }
+
+// Reads the rest of the file and closes it; true when it was well-formed.
+bool finish(ListReader *list) {
+    while (list->status == 1) move_on(list);
+    xmlFreeTextReader(list->reader);
+    return list->status == 0;
+}
+
+bool is_kept_entry(const DavShareEntry *entry, const char *only_path) {
+    return only_path == nullptr || strcmp(entry->path, only_path) == 0;
+}
+
+// Every item from the one in hand on is read; a new entry is started only
+// once the current one has a shared_name. With `only_path`, an entry with
+// another path is cleared and its record reused. -1 when memory runs out.
+int read_items(ListReader *list, DavShareEntry *entry, const char *prefix,
+               const char *only_path) {
     DavShareEntry *current = entry;
-    for (xmlNode *node = list->children; node != nullptr; node = node->next) {
+    for (xmlNode *node; (node = item_in_hand(list)) != nullptr; next_item(list)) {
         if (current->shared_name[0] != '\0') {
-            DavShareEntry *added = new_dav_share_entry();
-            if (added == nullptr) return -1;
-            current->next = added;
-            current = added;
+            if (!is_kept_entry(current, only_path)) {
+                *current = DavShareEntry{};
+            } else {
+                DavShareEntry *added = new_dav_share_entry();
+                if (added == nullptr) return -1;
+                current->next = added;
+                current = added;
+            }
         }
         read_item(current, node, prefix);
     }
+    if (!is_kept_entry(current, only_path)) *current = DavShareEntry{};
     return 0;
 }
 
-// The list element: the root's first child. Null for a file without one.
-xmlNode *list_element(xmlDoc *doc) {
-    xmlNode *root = xmlDocGetRootElement(doc);
-    return root != nullptr ? root->children : nullptr;
-}
-
-xmlDoc *parse_list_file(const char *path) {
-    quiet_xml_errors();
-    xmlKeepBlanksDefault(0);
-    return xmlReadFile(path, "UTF-8", XML_PARSE_NODICT);
-}
-
-// A volume list: count, then allen, then the items. A list without children
-// is a list without items.
-int read_counted_list(xmlDoc *doc, DavShareEntry *entry, const char *prefix, int *allen_out) {
-    xmlNode *list = list_element(doc);
-    if (list == nullptr || list->children == nullptr) return 0;
+// A volume list: count, then allen, then the items.
+int read_counted_items(ListReader *list, DavShareEntry *entry, const char *prefix,
+                       const char *only_path, int *allen_out) {
     char text[NUMBER_TEXT_WIDTH] = {};
-    xmlNode *count_node = list->children;
-    if (!copy_node_text_if_named(count_node, xml_name("count"), text, sizeof text)) return -1;
+    if (!copy_node_text_if_named(item_in_hand(list), xml_name("count"), text, sizeof text))
+        return -1;
     int count = to_int(text);
-    xmlNode *allen_node = count_node->next;
+    next_item(list);
+    xmlNode *allen_node = item_in_hand(list);
     if (allen_node == nullptr) {
         *allen_out = count;
     } else {
         if (!copy_node_text_if_named(allen_node, xml_name("allen"), text, sizeof text)) return -1;
         *allen_out = to_int(text);
+        next_item(list);
     }
     // The count says only whether there are items, not how many.
     if (count == 0 || count == -1) return 0;
-    return read_items(entry, list, prefix);
+    return read_items(list, entry, prefix, only_path);
+}
+
+enum class ListRead { read, refused, not_well_formed };
+
+// Reads the list file at `path` into `entry`, whose next is reset first; with
+// `allen_out`, as a volume list. On anything but `read` the entry is as it was.
+ListRead read_list_file(const char *path, DavShareEntry *entry, const char *prefix,
+                        const char *only_path, int *allen_out) {
+    entry->next = nullptr;
+    ListReader list;
+    if (!open_list_reader(&list, path)) return ListRead::not_well_formed;
+    DavShareEntry read = *entry;
+    int allen = allen_out != nullptr ? *allen_out : 0;
+    int result = 0;
+    if (enter_list(&list))
+        result = allen_out != nullptr ? read_counted_items(&list, &read, prefix, only_path, &allen)
+                                      : read_items(&list, &read, prefix, only_path);
+    bool well_formed = finish(&list);
+    if (!well_formed || result != 0) {
+        free_dav_share_list(read.next);
+        return well_formed ? ListRead::refused : ListRead::not_well_formed;
+    }
+    *entry = read;
+    if (allen_out != nullptr) *allen_out = allen;
+    return ListRead::read;
+}
+
+// One list of one volume; a list that exists but is not well-formed is
+// added to `unreadable` (unless null). With `only_path`, only the entries
+// with that path are kept.
+int read_volume_list_only(DavShareEntry *entry, const VolumeEntry *volume, const char *list_name,
+                          int *allen_out, PathNode *unreadable, const char *only_path) {
+    if (entry == nullptr) return -1;
+    entry->next = nullptr;
+    if (volume == nullptr || list_name == nullptr || allen_out == nullptr) return -1;
+    const char *prefix = strstr(list_name, "lighty_iso") != nullptr ? ISO_DIR : volume->mount_dir;
+    char *location = getDataLocationByVolume(list_name, volume->mount_dir);
+    if (location == nullptr || access(location, R_OK) != 0) {
+        free(location);
+        return -1;
+    }
+    ListRead read = read_list_file(location, entry, prefix, only_path, allen_out);
+    if (read == ListRead::not_well_formed) path_list_add(location, unreadable);
+    free(location);
+    return read == ListRead::read ? 0 : -1;
 }
 
 void append_list(DavShareEntry *head, DavShareEntry *tail) {
@@ -252,22 +383,7 @@ int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
 
 int read_volume_share_list_noting(DavShareEntry *entry, const VolumeEntry *volume,
                                   const char *list_name, int *allen_out, PathNode *unreadable) {
-    if (entry == nullptr) return -1;
-    entry->next = nullptr;
-    if (volume == nullptr || list_name == nullptr || allen_out == nullptr) return -1;
-    const char *prefix = strstr(list_name, "lighty_iso") != nullptr ? ISO_DIR : volume->mount_dir;
-    char *location = getDataLocationByVolume(list_name, volume->mount_dir);
-    if (location == nullptr || access(location, R_OK) != 0) {
-        free(location);
-        return -1;
-    }
-    xmlDoc *doc = parse_list_file(location);
-    if (doc == nullptr) path_list_add(location, unreadable);
-    free(location);
-    if (doc == nullptr) return -1;
-    int result = read_counted_list(doc, entry, prefix, allen_out);
-    free_xml_memory(doc);
-    return result;
+    return read_volume_list_only(entry, volume, list_name, allen_out, unreadable, nullptr);
 }
 
 namespace {
@@ -287,7 +403,8 @@ int load_lists(DavShareEntry *head, int *allen_out, PathNode *unreadable, const 
     for (const VolumeEntry *volume = volumes; volume != nullptr; volume = volume->next) {
         if (volume->mount_dir[0] == '\0' || !may_hold(volume->mount_dir, only_path)) continue;
         if (target == nullptr) target = new_dav_share_entry();
-        int read = read_volume_share_list_noting(target, volume, VOLUME_LIST, &allen, unreadable);
+        int read =
+            read_volume_list_only(target, volume, VOLUME_LIST, &allen, unreadable, only_path);
         *allen_out = allen;
         if (read == 0) {
             if (target != head) append_list(head, target);
@@ -307,8 +424,8 @@ int load_lists(DavShareEntry *head, int *allen_out, PathNode *unreadable, const 
     for (const VolumeEntry *volume = volumes; volume != nullptr && !iso_read; volume = volume->next) {
         if (volume->mount_dir[0] == '\0') continue;
         if (target == nullptr) target = new_dav_share_entry();
-        iso_read = read_volume_share_list_noting(target, volume, ISO_LIST, allen_out,
-                                                 unreadable_iso) == 0;
+        iso_read = read_volume_list_only(target, volume, ISO_LIST, allen_out, unreadable_iso,
+                                         only_path) == 0;
         if (iso_read) {
             append_list(head, target);
             target = nullptr;
@@ -342,12 +459,7 @@ int read_share_list_file(DavShareEntry *head, const char *file_path) {
     if (head == nullptr) return -1;
     head->next = nullptr;
     if (file_path == nullptr || access(file_path, R_OK) != 0) return -1;
-    xmlDoc *doc = parse_list_file(file_path);
-    if (doc == nullptr) return -1;
-    xmlNode *list = list_element(doc);
-    int result = list != nullptr ? read_items(head, list, "") : 0;
-    free_xml_memory(doc);
-    return result;
+    return read_list_file(file_path, head, "", nullptr, nullptr) == ListRead::read ? 0 : -1;
 }
 
 void write_dav_share_lists(const DavShareEntry *entries, const PathNode *directories, int allen,

@@ -29,7 +29,8 @@ void free_dav_share_list(DavShareEntry *head);
 // Reads one list file of one volume into the list at `entry` (its next is
 // reset first). 0 also for a list without items; -1 when the file is not
 // readable or well-formed, its first children are not count and allen, or
-// memory runs out (entries read so far stay linked).
+// memory runs out; the entry is then as it was. A NUL byte ends the text, and
+// the file is read as UTF-8 whatever its declaration says.
 int read_volume_share_list(DavShareEntry *entry, const VolumeEntry *volume,
                            const char *list_name, int *allen_out);
 // The same; a list file that exists but does not parse is added (by its
@@ -45,7 +46,8 @@ int load_dav_share_lists(DavShareEntry *head, int *allen_out);
 int load_dav_share_lists_noting(DavShareEntry *head, int *allen_out, PathNode *unreadable);
 // The same, reading only the lists that can hold an entry with exactly
 // `path`: those of the volumes it lies on, and the iso list for a path below
-// /mnt/isoMount. Entries with that path come in the same order.
+// /mnt/isoMount. Only the entries with that path are kept (others are
+// cleared), in the same order.
 int load_dav_share_lists_for(DavShareEntry *head, int *allen_out, const char *path);
 // The do/merge input file (full paths, count and allen ignored). 0 or -1.
 int read_share_list_file(DavShareEntry *head, const char *file_path);

@@ -18,7 +18,7 @@ const std::string LONG_NAME = std::string(240, 'n') + "&&&&", LONG_PATH = "/" + 
 
 void for_get(Appliance &box) {
     box.write_list(A2, {{"Public", "/Public"}, {"a&b \"q\"", "/Music"}, {"Whole", "/"}, {"R&D", "/R&D"},
-                        {LONG_NAME, "/Long"}, {"Deep", LONG_PATH}});
+                        {LONG_NAME, "/Long"}, {"Deep", LONG_PATH}, {"Later", "/Public"}});
     box.write(QUERY, EARLIER);
 }
 void get_off(Appliance &box) { for_get(box), box.set_config(ENABLE, "0"); }
@@ -68,6 +68,9 @@ const Row ROWS[] = {
     {"catalogue without samba", [](Appliance &box) { box.write("/var/www/xml/smb.xml", "<config/>"); }, NOTHING_CHANGED,
      {"start"}, {}},
     {"get", for_get, {{QUERY, answer("Public", A2 + "/Public")}}, {"get", A2 + "/Public"}, {}},
+    {"get in a list padded with NULs, as a crash can leave it",
+     [](Appliance &box) { box.write(list_of(A2), share_list_xml(7, {{"Public", "/Public"}}) + std::string(99, '\0')); },
+     {{QUERY, answer("Public", A2 + "/Public")}}, {"get", A2 + "/Public"}, {}},
     {"get prefix", for_get, {{QUERY, EARLIER}}, {"get", A2 + "/Pub"}, {}},
     {"get volume root", for_get, {{QUERY, answer("Whole", A2 + "/")}}, {"get", A2}, {}},
     {"get escapes", for_get, {{QUERY, answer("a&amp;b &quot;q&quot;", A2 + "/Music")}}, {"get", A2 + "/Music"}, {}},
