@@ -61,9 +61,13 @@ FILE *replacement_open(Replacement *replacement, const char *path) {
     return nullptr;
 }
 
+// /tmp does not outlive a restart, so a file there needs no sync: the rename
+// alone keeps readers from a half-written one.
+static bool outlives_restart(const char *path) { return strncmp(path, "/tmp/", 5) != 0; }
+
 int replacement_close(Replacement *replacement, FILE *file, mode_t mode) {
     bool written = fflush(file) == 0 && ferror(file) == 0 && fchmod(fileno(file), mode) == 0 &&
-                   fsync(fileno(file)) == 0;
+                   (!outlives_restart(replacement->path) || fsync(fileno(file)) == 0);
     written = fclose(file) == 0 && written;
     if (written) return 0;
     replacement_abandon(replacement);

@@ -19,7 +19,7 @@
 int touch_own_file(const char *path);
 
 // Replaces `path` by a file holding `length` bytes of `data`: written to a
-// new hidden file beside it, synced, then renamed over it. -1 when any step
+// new hidden file beside it, synced (unless below /tmp), then renamed over it. -1 when any step
 // fails; the old file is then untouched.
 [[nodiscard]] int replace_file(const char *path, const char *data, size_t length, mode_t mode);
 // The same in steps, for a caller that writes a stream or has work to do
