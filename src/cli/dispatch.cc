@@ -12,7 +12,7 @@
 #include "commands/del_user.h"
 #include "commands/do_merge.h"
 #include "commands/download_share.h"
-#include "cycle/get_query.h"
+#include "commands/get.h"
 #include "cycle/start_stop.h"
 
 static const int BAD_CALL = 255;

@@ -1,5 +1,5 @@
 #!/bin/bash
-# The tool's configuration served by a real Apache 2.4 through platform/apache
+# The tool's configuration served by a real Apache 2.4 through appliance/apache
 # and reached by real clients, in a throw-away demo appliance (with two more
 # shares whose names the configuration cannot carry: one would break the
 # file, one would name the server root).
@@ -7,7 +7,7 @@
 # Status 77 (skipped) when not root.
 set -uo pipefail
 ((EUID == 0)) || { echo "the real-server tests need root: skipped"; exit 77; }
-source "$(dirname "${BASH_SOURCE[0]}")/../../scripts/appliance.sh"
+source "$(dirname "${BASH_SOURCE[0]}")/../../appliance/appliance.sh"
 
 port=$(free_port)
 root=$(appliance_new "$2" "$port")

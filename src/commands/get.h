@@ -1,7 +1,7 @@
 // The get command: is a folder published, and under which name? The answer
 // goes to /tmp/webdav_query.xml. Takes no lock and changes no configuration.
-#ifndef DAVSYNC_CYCLE_GET_QUERY_H
-#define DAVSYNC_CYCLE_GET_QUERY_H
+#ifndef DAVSYNC_COMMANDS_GET_H
+#define DAVSYNC_COMMANDS_GET_H
 
 #include "shares/dav_share_list.h"
 

@@ -13,7 +13,6 @@ appliance_server_root=/usr/local/apache2_dav
 appliance_path=/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin
 # The server's user, as in Debian's base-passwd.
 appliance_www_id=33
-appliance_modules=/usr/lib/apache2/modules
 
 # Installs the Debian packages that are missing, through apt-get.
 install_missing() {
@@ -70,7 +69,7 @@ appliance_new() {
     chown "0:$appliance_www_id" "$root/etc/passwd.webdav"
     chmod 640 "$root/etc/passwd.webdav"
     install -m 755 "$davsync" "$root/usr/local/sbin/davsync"
-    install -m 755 "$appliance_repo/platform/apache" "$root/usr/local/sbin/apache"
+    install -m 755 "$appliance_repo/appliance/apache" "$root/usr/local/sbin/apache"
     appliance_main_conf "$port" >"$root$appliance_server_root/conf/httpd.conf"
     # The lock database: without it every write answers 500.
     chown "$appliance_www_id:$appliance_www_id" "$root$appliance_server_root/var"
@@ -78,41 +77,9 @@ appliance_new() {
     echo "$root"
 }
 
-# The server's main configuration. Everything outside the shares is denied
-# in the older form: a newer "Require all denied" here would be inherited by
-# the open shares. The shares are links, so they must be followed from /.
+# The server's main configuration, listening on 127.0.0.1:PORT.
 appliance_main_conf() {
-    local module
-    cat <<EOF
-ServerRoot "$appliance_server_root"
-Listen 127.0.0.1:$1
-ServerName 127.0.0.1
-User www-data
-Group www-data
-PidFile logs/httpd.pid
-ErrorLog logs/error_log
-LogLevel warn
-DocumentRoot "$appliance_server_root/htdocs"
-StartServers 1
-ServerLimit 2
-ThreadsPerChild 16
-MaxRequestWorkers 32
-MinSpareThreads 8
-MaxSpareThreads 32
-EOF
-    for module in mpm_event authz_core access_compat alias setenvif dav dav_fs authn_core \
-        auth_basic authn_file authz_user; do
-        echo "LoadModule ${module}_module $appliance_modules/mod_$module.so"
-    done
-    cat <<EOF
-<Directory />
-	Options FollowSymLinks
-	AllowOverride None
-	Order Deny,Allow
-	Deny from all
-</Directory>
-Include conf/extra/httpd-dav.conf
-EOF
+    sed "s/@LISTEN@/127.0.0.1:$1/" "$appliance_repo/appliance/httpd.conf"
 }
 
 # appliance_switch ROOT 0|1: the WebDAV switch in the configuration database.

@@ -1,4 +1,4 @@
-#include "cycle/get_query.h"
+#include "commands/get.h"
 
 #include <cstdio>
 #include <cstring>
