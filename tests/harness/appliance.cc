@@ -8,8 +8,12 @@
 #include <filesystem>
 #include <fstream>
 #include <sstream>
+#include <poll.h>
 #include <sys/prctl.h>
+#include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
+#include <sys/un.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -93,10 +97,18 @@ Appliance::Appliance() {
     write("/opt/program", "", 0755);  // the program of a run is bound here
     config_ = {{"/system_mgr/webdav/enable", "1"}, {"/system_mgr/samba/ads_enable", "0"}};
     write_config();
+    std::string log_path = host("/dev/log");
+    sockaddr_un log_address{AF_UNIX, {}};
+    log_path.copy(log_address.sun_path, sizeof log_address.sun_path - 1);
+    log_socket_ = socket(AF_UNIX, SOCK_DGRAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0);
+    if (log_path.size() >= sizeof log_address.sun_path || log_socket_ < 0 ||
+        bind(log_socket_, reinterpret_cast<sockaddr *>(&log_address), sizeof log_address) != 0)
+        ADD_FAILURE() << "appliance harness: cannot bind " << log_path;
 }
 
 Appliance::~Appliance() {
     for (const auto &[pid, number] : running_) kill(-pid, SIGKILL), waitpid(pid, nullptr, 0);
+    if (log_socket_ >= 0) close(log_socket_);
     fs::remove_all(dir_);
 }
 
@@ -191,12 +203,15 @@ pid_t Appliance::start(const std::vector<std::string> &args, const RunOptions &o
                                       root_, options.program.empty() ? DAVSYNC_STAGED_BINARY : options.program};
     if (geteuid() != 0) words.insert(words.begin() + 1, {"--user", "--map-root-user"});
     for (const auto &[inside, size] : options.tmpfs) words.insert(words.end(), {inside, size});
+    words.insert(words.end(), options.env.begin(), options.env.end());
+    if (!options.preload.empty()) words.push_back("LD_PRELOAD=" + options.preload);
     words.push_back("--");
     words.insert(words.end(), args.begin(), args.end());
     std::vector<char *> argv;
     for (std::string &word : words) argv.push_back(word.data());
     argv.push_back(nullptr);
     std::string output = dir_ + "/" + std::to_string(++runs_);
+    fflush(nullptr);  // else the child's freopen writes out what the caller had buffered
     pid_t pid = fork();
     if (pid == 0) {
         setpgid(0, 0);  // the run and every shell it starts go at once
@@ -215,6 +230,13 @@ pid_t Appliance::start(const std::vector<std::string> &args, const RunOptions &o
 RunResult Appliance::finish(pid_t pid) {
     auto found = running_.find(pid);
     if (found == running_.end()) return {};
+    // Drained while it runs: a run blocks in syslog(3) once the socket's queue is full.
+    int pid_fd = static_cast<int>(syscall(SYS_pidfd_open, pid, 0));
+    pollfd watched[] = {{pid_fd, POLLIN, 0}, {log_socket_, POLLIN, 0}};
+    do drain_log();
+    while (pid_fd >= 0 && poll(watched, 2, -1) >= 0 && !(watched[0].revents & POLLIN));
+    if (pid_fd >= 0) close(pid_fd);
+    drain_log();
     siginfo_t ended;
     waitid(P_PID, pid, &ended, WEXITED | WNOWAIT);  // not reaped yet, so the group id is still ours
     kill(-pid, SIGKILL);                            // for anything the run left behind
@@ -226,6 +248,16 @@ RunResult Appliance::finish(pid_t pid) {
     if (run.status == 125 || run.err.rfind("unshare:", 0) == 0)
         ADD_FAILURE() << "appliance harness: no private mount namespace, or its set-up failed:\n" << run.err;
     return run;
+}
+
+void Appliance::drain_log() {
+    char message[4096];
+    for (ssize_t size; (size = recv(log_socket_, message, sizeof message, 0)) >= 0;) log_.emplace_back(message, size);
+}
+
+std::vector<std::string> Appliance::log_lines() {
+    drain_log();
+    return log_;
 }
 
 std::vector<std::string> Appliance::apache_calls() const {

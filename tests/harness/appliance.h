@@ -3,10 +3,11 @@
 // private mount and PID namespaces (util-linux unshare, then enter_root.sh),
 // with the host's /usr (but /usr/local) and /lib* bound read-only, /dev/null
 // bound, a /proc of its own, umask 077 and PATH as the only environment
-// variable. Executables in /opt/alongside start beside it (outside the
-// chroot): only they and the run's own processes are seen in /proc. A
-// recording "apache" first on PATH appends its arguments as one line to
-// /var/log/apache_calls. Every path a member takes is a path inside the root.
+// variable (and what a run adds). Executables in /opt/alongside start beside
+// it (outside the chroot): only they and the run's own processes are seen in
+// /proc. A recording "apache" first on PATH appends its arguments as one line
+// to /var/log/apache_calls. A datagram socket at /dev/log takes what the runs
+// send to syslog. Every path a member takes is a path inside the root.
 #ifndef DAVSYNC_TESTS_HARNESS_APPLIANCE_H
 #define DAVSYNC_TESTS_HARNESS_APPLIANCE_H
 
@@ -33,6 +34,8 @@ struct RunOptions {
     std::vector<std::pair<std::string, std::string>> tmpfs;
     int kill_after_ms = 0;  // SIGKILL the run and every shell it started after this delay
     std::string program;    // a host program to run instead of davsync
+    std::vector<std::string> env;  // NAME=VALUE words added to the run's environment
+    std::string preload;           // a host library preloaded into the program (bound at /opt/preload)
 };
 
 class Appliance {
@@ -73,6 +76,7 @@ public:
     pid_t start(const std::vector<std::string> &args, const RunOptions &options = {});
     RunResult finish(pid_t pid);  // waits for a started run
     std::vector<std::string> apache_calls() const;
+    std::vector<std::string> log_lines();  // every message sent to /dev/log so far, in order
 
 private:
     void write_config();
@@ -80,6 +84,9 @@ private:
     std::map<std::string, std::string> config_;
     std::map<pid_t, int> running_;  // started runs and the numbers that name their output files
     int runs_ = 0;
+    int log_socket_ = -1;
+    std::vector<std::string> log_;
+    void drain_log();
 };
 
 }  // namespace appliance
