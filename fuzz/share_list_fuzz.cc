@@ -1,15 +1,26 @@
-// The volume list reader on any lighty.xml in a scratch volume's hidden folder.
-#include "base/text_field.h"
-#include "entry_checks.h"
+// The share list reader on any text, as a volume list (first byte even) or
+// as a do/merge input file (odd): every text field terminated within its
+// width, every path read starting with the prefix, and a refused text
+// leaving the head entry as it was.
+#include "fuzz_input.h"
+#include "shares/share_list_reader.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
-    write_input(".system_data/lighty.xml", data, size);
-    VolumeEntry volume = {};
-    FUZZ_CHECK(copy_text(volume.mount_dir, scratch_folder()) == 0);
+    if (size == 0) return 0;
+    bool volume_list = data[0] % 2 == 0;
+    const char *prefix = volume_list ? "/mnt/HD/HD_a2" : "";
+    std::string text(reinterpret_cast<const char *>(data + 1), size - 1);
     DavShareEntry *head = new_dav_share_entry();
-    int allen = 0;
-    int result = read_volume_share_list(head, &volume, "lighty.xml", &allen);
-    check_entries(result, head, volume.mount_dir);
+    head->RW = 42;
+    int allen = -7;
+    ListRequest request = {volume_list ? ListKind::volume_list : ListKind::input_file, prefix, nullptr};
+    ListParse result = parse_share_list(text.data(), text.size(), request, head, volume_list ? &allen : nullptr);
+    if (result != ListParse::read) FUZZ_CHECK(head->next == nullptr && head->RW == 42 && allen == -7);
+    for (const DavShareEntry *entry = head; entry != nullptr; entry = entry->next) {
+        FUZZ_CHECK(strnlen(entry->shared_name, DAV_TEXT_WIDTH) < DAV_TEXT_WIDTH);
+        FUZZ_CHECK(strnlen(entry->path, DAV_TEXT_WIDTH) < DAV_TEXT_WIDTH);
+        FUZZ_CHECK(entry->path[0] == '\0' || strncmp(entry->path, prefix, strlen(prefix)) == 0);
+    }
     free_dav_share_list(head);
     return 0;
 }

@@ -6,7 +6,7 @@
 
 #include "cli/decode.h"
 #include "fuzz_input.h"
-#include "shares/dav_share_list.h"
+#include "shares/xml_helpers.h"
 
 static bool entities_only(const char *escaped) {
     for (const char *at = strchr(escaped, '&'); at != nullptr; at = strchr(at + 1, '&'))

@@ -2,8 +2,12 @@
 // names. Tokens are cut at '#' and ','; "@group" names a system group (only
 // its listed members count), "@allaccount" stands for "All Account". Groups
 // never add a name already in the list; user entries are not de-duplicated.
+// Names of 64 characters or more are skipped, and text beyond 12,799
+// characters is not read (a token cut there is dropped whole).
 #ifndef DAVSYNC_ACCESS_USER_LIST_H
 #define DAVSYNC_ACCESS_USER_LIST_H
+
+#include <cstddef>
 
 #include "base/name_index.h"
 
@@ -17,26 +21,32 @@ struct NameNode {
 
 [[nodiscard]] NameNode *new_name_node();
 void free_name_list(NameNode *head);
-// Members of group `group_name` in database order, no open slot; an unknown
-// or memberless group gives one empty node. 0, or -1 when memory runs out
-// (nothing stored).
-int get_group_members(const char *group_name, NameNode **members_out);
 
-// The system's group database, read whole once, on the first look-up, for a
-// run that expands many lists.
+// The system's group database, read whole on the first look-up, for a run
+// that expands many lists, with the scratch index an expansion reuses.
 struct GroupTable {
     bool loaded;
-    NameIndex groups;  // group name -> its member chain (NameNode, no open slot)
+    NameIndex groups;  // group name -> its member chain (NameNode)
+    NameIndex seen;    // the names of the expansion under way
 };
 void group_table_init(GroupTable *table);
 void group_table_free(GroupTable *table);
 
-// Expands `list_text` (unchanged) into a list that ends with one empty node,
-// the open slot. The head is stored first. 0, or -1 when memory runs out
-// (the stored head, if any, holds what was gathered and is the caller's).
-// Names of 64 characters or more are skipped; text beyond 12,799 characters
-// is not read. The _with form takes groups from `table`.
+// An expansion's names in order. They are borrowed: from `work`, the cut
+// copy of the list text it owns, and from the group table.
+struct NameArray {
+    const char **names;
+    size_t count;
+    size_t capacity;
+    char *work;
+};
+
+// Expands `list_text` (unchanged) with the groups of `table`. 0, or -1 when
+// memory runs out (what was gathered stays, and is the caller's to free).
+int expand_user_names(GroupTable *table, const char *list_text, NameArray *names);
+void free_name_array(NameArray *names);
+// The same as a chain of nodes that ends with one empty node, the open slot.
+// The head is stored first; on -1 it holds what was gathered.
 int expand_user_list(const char *list_text, NameNode **list_out);
-int expand_user_list_with(GroupTable *table, const char *list_text, NameNode **list_out);
 
 #endif

@@ -2,8 +2,18 @@
 
 #include <cstring>
 
+#include "base/text_field.h"
+
 static const char USB_PREFIX[] = "/mnt/USB/";
 static const size_t USB_PREFIX_LENGTH = sizeof USB_PREFIX - 1;
+
+int usb_marker_path(const char *folder, char *marker, size_t width) {
+    size_t length = strlen(folder);
+    while (length > 1 && folder[length - 1] == '/') --length;
+    return format_text_field(marker, width, "%.*s/%s", static_cast<int>(length), folder, USB_MARKER);
+}
+
+bool is_iso_path(const char *path) { return strncmp(path, ISO_DIR, VOLUME_PREFIX_LENGTH) == 0; }
 
 bool is_usb_path(const char *path) { return strncmp(path, USB_PREFIX, USB_PREFIX_LENGTH) == 0; }
 
@@ -22,7 +32,7 @@ static const char *after_volume_folder(const char *path) {
     if (strncmp(path, "/mnt/HD/HD_", 11) == 0 && path[11] >= 'a' && path[11] <= 'z' &&
         path[12] == '2')
         return path + 13;
-    if (strncmp(path, ISO_DIR, VOLUME_PREFIX_LENGTH) == 0) return path + VOLUME_PREFIX_LENGTH;
+    if (is_iso_path(path)) return path + VOLUME_PREFIX_LENGTH;
     if (is_usb_path(path)) {
         const char *name = usb_folder_name(path);
         size_t name_length = strcspn(name, "/");

@@ -14,12 +14,22 @@ constexpr const char *START_LOCK_FILE = "/tmp/corvane_start_lock";
 constexpr const char *USB_DIR = "/mnt/USB";
 constexpr const char *ISO_DIR = "/mnt/isoMount";
 constexpr const char *USB_MARKER = ".davconf";
+// The record of a change being made real (see commit_record.h): beside the
+// configuration, in a folder only the appliance writes, on a disk that
+// outlives a restart.
+constexpr const char *COMMIT_RECORD_FILE = "/usr/local/apache2_dav/conf/extra/.davsync-commit";
 
 // Every data volume directory ("/mnt/HD/HD_a2") and "/mnt/isoMount" is this long.
 constexpr size_t VOLUME_PREFIX_LENGTH = 13;
 // Lines, commands, argument and list work areas.
 constexpr size_t LINE_BUFFER_WIDTH = 12800;
 
+// "<folder>/.davconf", the folder's trailing slashes dropped. -1 when it
+// does not fit `width`.
+int usb_marker_path(const char *folder, char *marker, size_t width);
+// Whether the path lies on the iso mount: its first 13 characters are
+// "/mnt/isoMount".
+bool is_iso_path(const char *path);
 // Below "/mnt/USB/".
 bool is_usb_path(const char *path);
 // The name of a USB folder: what follows "/mnt/USB/".

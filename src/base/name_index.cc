@@ -62,6 +62,13 @@ int name_index_add(NameIndex *index, const char *key, void *value) {
     return 0;
 }
 
+void name_index_clear(NameIndex *index) {
+    if (index->count == 0) return;
+    // A slot without a key is empty whatever its value.
+    memset(index->keys, 0, index->capacity * sizeof *index->keys);
+    index->count = 0;
+}
+
 void name_index_free(NameIndex *index) {
     free(index->keys);
     free(index->values);

@@ -20,6 +20,8 @@ void *name_index_find(const NameIndex *index, const char *key);
 // Adds `key` unless it is there already. 0 when added, 1 when present, -1
 // when memory runs out.
 [[nodiscard]] int name_index_add(NameIndex *index, const char *key, void *value);
+// Empties the index, keeping its room for the next use.
+void name_index_clear(NameIndex *index);
 void name_index_free(NameIndex *index);
 
 #endif

@@ -6,23 +6,26 @@
 #include <dirent.h>
 #include <fcntl.h>
 #include <sys/file.h>
+#include <sys/random.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "base/appliance_paths.h"
+#include "base/commit_record.h"
 #include "base/text_field.h"
 
 static const int NO_SURPRISES = O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
 
 static int keep_if_own_regular(int fd) {
-    struct stat status;
     if (fd == -1) return -1;
-    if (fstat(fd, &status) != 0 || !S_ISREG(status.st_mode) || status.st_uid != geteuid() ||
-        fcntl(fd, F_SETFL, fcntl(fd, F_GETFL) & ~O_NONBLOCK) != 0) {
-        close(fd);
-        return -1;
-    }
-    return fd;
+    struct stat status;
+    int error = 0;
+    if (fstat(fd, &status) != 0) error = errno;
+    else if (!S_ISREG(status.st_mode) || status.st_uid != geteuid()) error = EPERM;
+    else if (fcntl(fd, F_SETFL, fcntl(fd, F_GETFL) & ~O_NONBLOCK) != 0) error = errno;
+    if (error == 0) return fd;
+    close(fd);
+    errno = error;
+    return -1;
 }
 
 int open_own_regular(const char *path, int flags, mode_t mode) {
@@ -33,68 +36,134 @@ int open_own_regular_at(int dir_fd, const char *name, int flags, mode_t mode) {
     return keep_if_own_regular(openat(dir_fd, name, flags | NO_SURPRISES, mode));
 }
 
+// Closes `fd`; -1 when the close or `result` failed, with the first error.
+static int close_keeping(int fd, int result) {
+    int error = errno;
+    if (close(fd) != 0 && result == 0) return -1;
+    errno = error;
+    return result;
+}
+
 int touch_own_file(const char *path) {
     int fd = open_own_regular(path, O_WRONLY | O_CREAT, 0644);
     if (fd == -1) return -1;
-    int result = futimens(fd, nullptr);
-    return close(fd) == 0 ? result : -1;
+    return close_keeping(fd, futimens(fd, nullptr));
 }
 
-// "<dir>/.<name>.XXXXXX": beside the target, so the rename stays on one
-// file system, and hidden from a reader of the folder.
-static int temporary_beside(char (&temporary)[4096], const char *path) {
+int write_all(int fd, const void *data, size_t length) {
+    const char *at = static_cast<const char *>(data);
+    while (length > 0) {
+        ssize_t put = write(fd, at, length);
+        if (put < 0 && errno == EINTR) continue;
+        if (put <= 0) {
+            if (put == 0) errno = EIO;
+            return -1;
+        }
+        at += put;
+        length -= static_cast<size_t>(put);
+    }
+    return 0;
+}
+
+int sync_dir(int dir_fd) {
+    int fd = openat(dir_fd, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (fd == -1) return -1;
+    return close_keeping(fd, fsync(fd));
+}
+
+static int write_synced(int fd, const char *data, size_t length, mode_t mode, bool sync) {
+    int result = fchmod(fd, mode) == 0 && write_all(fd, data, length) == 0 &&
+                         (!sync || fsync(fd) == 0)
+                     ? 0
+                     : -1;
+    return close_keeping(fd, result);
+}
+
+int stage_file(const char *path, const char *data, size_t length, mode_t mode) {
+    char staged[4096];
+    if (staged_path_of(path, staged, sizeof staged) != 0) return errno = ENAMETOOLONG, -1;
+    if (unlink(staged) != 0 && errno != ENOENT) return -1;
+    int fd = open(staged, O_WRONLY | O_CREAT | O_EXCL | NO_SURPRISES, mode);
+    if (fd == -1) return -1;
+    if (write_synced(fd, data, length, mode, true) == 0) return 0;
+    int error = errno;
+    unlink(staged);
+    errno = error;
+    return -1;
+}
+
+// The folder of `path` ("." for a bare name) and where its name starts.
+static int folder_of(const char *path, char (&dir)[4096], const char **name) {
     const char *slash = strrchr(path, '/');
-    int dir_length = slash == nullptr ? 0 : static_cast<int>(slash - path + 1);
-    return format_text_field(temporary, sizeof temporary, "%.*s.%s.XXXXXX", dir_length, path,
-                             path + dir_length);
-}
-
-FILE *replacement_open(Replacement *replacement, const char *path) {
-    replacement->path = path;
-    replacement->temporary[0] = '\0';
-    if (temporary_beside(replacement->temporary, path) != 0) return nullptr;
-    int fd = mkostemp(replacement->temporary, O_CLOEXEC);
-    FILE *file = fd == -1 ? nullptr : fdopen(fd, "w");
-    if (file != nullptr) return file;
-    if (fd != -1) close(fd);
-    replacement_abandon(replacement);
-    return nullptr;
+    *name = slash == nullptr ? path : slash + 1;
+    if (slash == nullptr) return copy_text(dir, ".");
+    return copy_text_prefix(dir, sizeof dir, path, slash == path ? 1 : static_cast<size_t>(slash - path));
 }
 
 // /tmp does not outlive a restart, so a file there needs no sync: the rename
 // alone keeps readers from a half-written one.
 static bool outlives_restart(const char *path) { return strncmp(path, "/tmp/", 5) != 0; }
 
-int replacement_close(Replacement *replacement, FILE *file, mode_t mode) {
-    bool written = fflush(file) == 0 && ferror(file) == 0 && fchmod(fileno(file), mode) == 0 &&
-                   (!outlives_restart(replacement->path) || fsync(fileno(file)) == 0);
-    written = fclose(file) == 0 && written;
-    if (written) return 0;
-    replacement_abandon(replacement);
-    return -1;
-}
-
-int replacement_write(Replacement *replacement, const char *path, const char *data,
-                      size_t length, mode_t mode) {
-    FILE *file = replacement_open(replacement, path);
-    if (file == nullptr) return -1;
-    fwrite(data, 1, length, file);
-    return replacement_close(replacement, file, mode);
-}
-
-int replacement_commit(Replacement *replacement) {
-    if (replacement->temporary[0] == '\0') return -1;
-    if (rename(replacement->temporary, replacement->path) == 0) {
-        replacement->temporary[0] = '\0';
-        return 0;
+// An unnamed file in `dir`, or (on a file system without them) a named
+// temporary; either is under flock before anyone can see it by name.
+static int open_unnamed(const char *dir, char (&named)[4096], const char *name, mode_t mode) {
+    named[0] = '\0';
+    int fd = open(dir, O_TMPFILE | O_WRONLY | O_CLOEXEC, mode);
+    if (fd == -1 && (errno == EOPNOTSUPP || errno == EISDIR)) {
+        if (format_text_field(named, sizeof named, "%s/.%s.XXXXXX", dir, name) != 0)
+            return errno = ENAMETOOLONG, -1;
+        fd = mkostemp(named, O_CLOEXEC);
+        if (fd == -1) named[0] = '\0';
     }
-    replacement_abandon(replacement);
-    return -1;
+    if (fd != -1 && flock(fd, LOCK_EX) != 0) {
+        int error = errno;
+        if (named[0] != '\0') unlink(named);
+        close(fd);
+        errno = error;
+        return -1;
+    }
+    return fd;
 }
 
-void replacement_abandon(Replacement *replacement) {
-    if (replacement->temporary[0] != '\0') unlink(replacement->temporary);
-    replacement->temporary[0] = '\0';
+// Gives the unnamed file `fd` the hidden name ".<name>.XXXXXX" in `dir`.
+static int link_unnamed(int fd, const char *dir, const char *name, char (&named)[4096]) {
+    static const char LETTERS[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789";
+    char proc_path[64];
+    format_text_field(proc_path, sizeof proc_path, "/proc/self/fd/%d", fd);
+    for (int attempt = 0; attempt < 100; ++attempt) {
+        unsigned char noise[6];
+        if (getrandom(noise, sizeof noise, 0) != sizeof noise) return -1;
+        char suffix[7] = {};
+        for (size_t i = 0; i < sizeof noise; ++i) suffix[i] = LETTERS[noise[i] % (sizeof LETTERS - 1)];
+        if (format_text_field(named, sizeof named, "%s/.%s.%s", dir, name, suffix) != 0)
+            return errno = ENAMETOOLONG, -1;
+        if (linkat(fd, "", AT_FDCWD, named, AT_EMPTY_PATH) == 0) return 0;
+        // Linking by descriptor needs a capability; through /proc it does not.
+        if ((errno == ENOENT || errno == EPERM) &&
+            linkat(AT_FDCWD, proc_path, AT_FDCWD, named, AT_SYMLINK_FOLLOW) == 0)
+            return 0;
+        if (errno != EEXIST) return -1;
+    }
+    return errno = EEXIST, -1;
+}
+
+int replace_file(const char *path, const char *data, size_t length, mode_t mode) {
+    char dir[4096];
+    const char *name;
+    char named[4096];
+    if (folder_of(path, dir, &name) != 0) return errno = ENAMETOOLONG, -1;
+    int fd = open_unnamed(dir, named, name, mode);
+    if (fd == -1) return -1;
+    bool whole = fchmod(fd, mode) == 0 && write_all(fd, data, length) == 0 &&
+                 (!outlives_restart(path) || fsync(fd) == 0) &&
+                 (named[0] != '\0' || link_unnamed(fd, dir, name, named) == 0) &&
+                 rename(named, path) == 0;
+    int error = errno;
+    if (!whole && named[0] != '\0') unlink(named);
+    // The lock goes with the last descriptor, after the rename.
+    if (close(fd) != 0 && whole) return -1;
+    errno = error;
+    return whole ? 0 : -1;
 }
 
 static bool is_temporary_name(const char *name, const char *prefix) {
@@ -102,90 +171,100 @@ static bool is_temporary_name(const char *name, const char *prefix) {
     return strncmp(name, prefix, length) == 0 && strlen(name) == length + 6;
 }
 
-static void remove_folder_files(int dir_fd, const char *name) {
+// Whether nobody holds the file `name`: a live writer keeps a flock on it.
+static bool is_abandoned(int dir_fd, const char *name) {
+    int fd = openat(dir_fd, name, O_RDONLY | NO_SURPRISES);
+    if (fd == -1) return false;
+    bool free = flock(fd, LOCK_EX | LOCK_NB) == 0;
+    close(fd);
+    return free;
+}
+
+// Calls `remove` for this user's entries of `dir` that one of `prefixes`
+// names (a temporary's name: the prefix and six characters).
+static int sweep(const char *dir, const char *const *prefixes, int prefix_count, bool check_lock) {
+    DIR *listing = opendir(dir);
+    if (listing == nullptr) return errno == ENOENT || errno == ENOTDIR ? 0 : -1;
+    int dir_fd = dirfd(listing);
+    int removed = 0;
+    for (;;) {
+        errno = 0;
+        const struct dirent *entry = readdir(listing);
+        if (entry == nullptr) break;
+        bool named = false;
+        for (int i = 0; i < prefix_count && !named; ++i) named = is_temporary_name(entry->d_name, prefixes[i]);
+        struct stat status;
+        if (!named || fstatat(dir_fd, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0 ||
+            status.st_uid != geteuid() || !(S_ISDIR(status.st_mode) || S_ISREG(status.st_mode)) ||
+            (check_lock && !is_abandoned(dir_fd, entry->d_name)))
+            continue;
+        if (remove_tree_at(dir_fd, entry->d_name) == 0) ++removed;
+    }
+    int error = errno;
+    closedir(listing);
+    errno = error;
+    return error != 0 ? -1 : removed;
+}
+
+int remove_stale_temporaries(const char *dir, const char *const *prefixes, int count) {
+    return sweep(dir, prefixes, count, false);
+}
+
+int remove_stale_replacements(const char *path) {
+    char dir[4096];
+    const char *name;
+    char hidden[300];
+    char plain[300];
+    if (folder_of(path, dir, &name) != 0 ||
+        format_text_field(hidden, sizeof hidden, ".%s.", name) != 0 ||
+        format_text_field(plain, sizeof plain, "%s.", name) != 0)
+        return 0;
+    const char *const prefixes[] = {hidden, plain};
+    return sweep(dir, prefixes, 2, true);
+}
+
+int remove_tree_at(int dir_fd, const char *name) {
+    if (unlinkat(dir_fd, name, 0) == 0) return 0;
+    if (errno != EISDIR && errno != EPERM) return -1;
     int fd = openat(dir_fd, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     DIR *folder = fd == -1 ? nullptr : fdopendir(fd);
     if (folder == nullptr) {
         if (fd != -1) close(fd);
-        return;
+        return -1;
     }
+    // What cannot be removed inside shows when the folder itself cannot be.
     while (const struct dirent *entry = readdir(folder))
-        if (entry->d_name[0] != '.' || (strcmp(entry->d_name, ".") && strcmp(entry->d_name, "..")))
-            unlinkat(dirfd(folder), entry->d_name, 0);
+        if (strcmp(entry->d_name, ".") != 0 && strcmp(entry->d_name, "..") != 0)
+            remove_tree_at(dirfd(folder), entry->d_name);
     closedir(folder);
-}
-
-void remove_stale_temporaries(const char *dir, const char *prefix) {
-    DIR *listing = opendir(dir);
-    if (listing == nullptr) return;
-    int dir_fd = dirfd(listing);
-    while (const struct dirent *entry = readdir(listing)) {
-        struct stat status;
-        if (!is_temporary_name(entry->d_name, prefix) ||
-            fstatat(dir_fd, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0 ||
-            status.st_uid != geteuid())
-            continue;
-        if (S_ISDIR(status.st_mode)) {
-            remove_folder_files(dir_fd, entry->d_name);
-            unlinkat(dir_fd, entry->d_name, AT_REMOVEDIR);
-        } else if (S_ISREG(status.st_mode)) {
-            unlinkat(dir_fd, entry->d_name, 0);
-        }
-    }
-    closedir(listing);
-}
-
-void remove_stale_replacements(const char *path) {
-    const char *slash = strrchr(path, '/');
-    if (slash == nullptr || slash == path) return;
-    char dir[4096];
-    char prefix[4096];
-    if (copy_text_prefix(dir, sizeof dir, path, static_cast<size_t>(slash - path)) != 0 ||
-        format_text_field(prefix, sizeof prefix, ".%s.", slash + 1) != 0)
-        return;
-    remove_stale_temporaries(dir, prefix);
-}
-
-int replace_file(const char *path, const char *data, size_t length, mode_t mode) {
-    Replacement replacement;
-    if (replacement_write(&replacement, path, data, length, mode) != 0) return -1;
-    return replacement_commit(&replacement);
+    return unlinkat(dir_fd, name, AT_REMOVEDIR);
 }
 
 int open_dir_no_links(const char *path) {
-    if (path[0] != '/') return -1;
+    if (path[0] != '/') return errno = EINVAL, -1;
     int dir_fd = open("/", O_PATH | O_DIRECTORY | O_CLOEXEC);
     for (const char *at = path + 1; dir_fd != -1 && *at != '\0';) {
         size_t length = strcspn(at, "/");
-        char name[LINE_BUFFER_WIDTH];
+        char name[256];
         if (copy_text_prefix(name, sizeof name, at, length) != 0 || strcmp(name, ".") == 0 ||
             strcmp(name, "..") == 0) {
             close(dir_fd);
-            return -1;
+            return errno = EINVAL, -1;
         }
         at += length;
         while (*at == '/') ++at;
         if (name[0] == '\0') continue;
         int next = openat(dir_fd, name, O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+        int error = errno;
+        struct stat status;
+        if (next == -1 && error == ENOTDIR &&
+            fstatat(dir_fd, name, &status, AT_SYMLINK_NOFOLLOW) == 0 && S_ISLNK(status.st_mode))
+            error = ELOOP;
         close(dir_fd);
+        errno = error;
         dir_fd = next;
     }
     return dir_fd;
-}
-
-FILE *open_locked_for_reading(const char *path) {
-    FILE *file = fopen(path, "re");
-    if (file == nullptr) return nullptr;
-    if (flock(fileno(file), LOCK_EX) != 0) {
-        fclose(file);
-        return nullptr;
-    }
-    return file;
-}
-
-void close_locked(FILE *file) {
-    flock(fileno(file), LOCK_UN);
-    fclose(file);
 }
 
 int memory_file_open(MemoryFile *file) {

@@ -7,6 +7,6 @@
 int webdav_del_user(const char *user) {
     (void)user;
     CycleRun run;
-    if (cycle_begin(&run, editing_variant(), -1) < 0) return -1;
+    if (cycle_begin(&run, CYCLE_DU) < 0) return -1;
     return cycle_finish(&run);
 }

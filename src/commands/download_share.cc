@@ -1,14 +1,16 @@
 #include "commands/download_share.h"
 
+#include <cerrno>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
 
-#include "base/safe_file.h"
+#include "base/appliance_paths.h"
+#include "base/file_read.h"
 #include "base/text_field.h"
+#include "cycle/config_switches.h"
 #include "cycle/regeneration.h"
 #include "platform/apkg_lib.h"
-#include "platform/config_db.h"
 
 static const char VOLUME_MARK[] = "/mnt/HD/HD_";
 
@@ -28,7 +30,8 @@ static bool is_of_kind(const DavShareEntry *entry, const DownloadKind *kind) {
 
 // Replaces every entry of the kind by one entry on the given volume, keeping
 // RW and enable of an entry that already had that path.
-static int add_download_entry(DavShareEntry *entries, int volume_index, const DownloadKind *kind) {
+static int add_download_entry(CycleRun *run, int volume_index, const DownloadKind *kind) {
+    DavShareEntry *entries = run->entries;
     char target[1024];
     format_text_field(target, sizeof target, "/mnt/HD/HD_%c2%s", 'a' + volume_index, kind->folder);
     int rw = 1;
@@ -41,19 +44,16 @@ static int add_download_entry(DavShareEntry *entries, int volume_index, const Do
             rw = entry->RW;
             enable = entry->enable;
         }
-        memset(entry->shared_name, 0, sizeof entry->shared_name);
-        memset(entry->path, 0, sizeof entry->path);
-        entry->RW = 0;
-        entry->enable = 0;
+        empty_entry(entry);
     }
     DavShareEntry *added = new_dav_share_entry();
-    if (added == nullptr) return -1;
+    if (added == nullptr) return note_failure(&run->failure, "cannot make room for", target, ENOMEM);
     copy_text(added->shared_name, kind->shared_name);
     copy_text(added->path, target);
     added->RW = rw;
     added->enable = enable;
     last->next = added;
-    return volume_index;
+    return 0;
 }
 
 static char volume_letter_in(const char *text) {
@@ -61,10 +61,11 @@ static char volume_letter_in(const char *text) {
     return mark == nullptr ? '\0' : mark[sizeof VOLUME_MARK - 1];
 }
 
-// The stretch of the line from "save_path" up to the next "save_path": on one
-// line that is the element's name, its content and the start of its end tag.
-static int volume_index_in_save_path_line(const char *line) {
-    const char *first = strstr(line, "save_path");
+// The stretch of the piece from "save_path" up to the next "save_path": on
+// one line that is the element's name, its content and the start of its end
+// tag.
+static int volume_index_in_save_path_piece(const char *piece) {
+    const char *first = strstr(piece, "save_path");
     const char *second = strstr(first + 1, "save_path");
     if (second == nullptr) return -1;
     char stretch[128];
@@ -74,24 +75,40 @@ static int volume_index_in_save_path_line(const char *line) {
     return index < 0 ? -1 : index;
 }
 
-int read_p2p_save_volume_in(const char *file_path) {
-    FILE *settings = open_locked_for_reading(file_path);
-    if (settings == nullptr) return -1;
-    char line[1024] = {};
-    bool found = false;
-    while (!found && fgets(line, sizeof line, settings) != nullptr)
-        found = strstr(line, "save_path") != nullptr;
-    close_locked(settings);
-    return found ? volume_index_in_save_path_line(line) : -1;
+int p2p_save_volume_in_text(const char *text) {
+    static const size_t PIECE_WIDTH = 1024;
+    for (const char *at = text; *at != '\0';) {
+        size_t length = strcspn(at, "\n");
+        if (at[length] == '\n') ++length;
+        if (length > PIECE_WIDTH - 1) length = PIECE_WIDTH - 1;
+        char piece[PIECE_WIDTH];
+        copy_text_prefix(piece, sizeof piece, at, length);
+        if (strstr(piece, "save_path") != nullptr) return volume_index_in_save_path_piece(piece);
+        at += length;
+    }
+    return -1;
 }
 
-int read_p2p_save_volume() { return read_p2p_save_volume_in("/etc/NAS_CFG/p2psettings.xml"); }
+// The download volume of the p2p manager; -1 when there is none, -2 with the
+// failure noted.
+static int p2p_save_volume(CycleRun *run) {
+    static const char SETTINGS[] = "/etc/NAS_CFG/p2psettings.xml";
+    FileBytes bytes = {};
+    FileState state = read_whole_file(SETTINGS, &bytes, READ_LOCKED);
+    if (state == FileState::failed) return note_failure(&run->failure, "cannot read", SETTINGS, errno), -2;
+    int index = state == FileState::read ? p2p_save_volume_in_text(bytes.data) : -1;
+    free_file_bytes(&bytes);
+    return index;
+}
 
-int add_p2p_share_entry(DavShareEntry *entries) {
-    if (xml_get_int("/download_mgr/p2p/enable") != 1) return -1;
-    int volume_index = read_p2p_save_volume();
-    if (volume_index < 0) return -1;
-    return add_download_entry(entries, volume_index, &P2P_KIND);
+static int add_p2p_share_entry(CycleRun *run) {
+    bool on = false;
+    if (read_p2p_switch(&on, &run->failure) != 0) return -1;
+    if (!on) return 0;
+    int volume_index = p2p_save_volume(run);
+    if (volume_index == -2) return -1;
+    if (volume_index < 0) return 0;
+    return add_download_entry(run, volume_index, &P2P_KIND);
 }
 
 // Fields are read at the package library's own byte offsets.
@@ -111,34 +128,31 @@ static char amule_volume_letter() {
     return '\0';
 }
 
-int add_amule_share_entry(DavShareEntry *entries) {
-    if (LIB_Check_ps("apkg") != 1) return -1;
+static int add_amule_share_entry(CycleRun *run) {
+    if (LIB_Check_ps("apkg") != 1) return 0;
     APKG_COMMAND(1, 0);
-    APKG_ReadAllXml();
+    if (APKG_ReadAllXml() != 0) {
+        APKG_FreeAllXml();
+        return note_failure(&run->failure, "cannot make room for", "the package list", ENOMEM);
+    }
     char letter = amule_volume_letter();
     APKG_FreeAllXml();
-    if (letter == '\0') return -1;
+    if (letter == '\0') return 0;
     int volume_index = static_cast<int8_t>(letter - 'a');
-    if (volume_index < 0) return -1;
-    return add_download_entry(entries, volume_index, &AMULE_KIND);
-}
-
-static CycleVariant download_share_variant() {
-    CycleVariant variant = editing_variant();
-    variant.writer = WRITE_ALL_VOLUMES;
-    return variant;
+    if (volume_index < 0) return 0;
+    return add_download_entry(run, volume_index, &AMULE_KIND);
 }
 
 int webdav_p2p_share() {
     CycleRun run;
-    if (cycle_begin(&run, download_share_variant(), -1) < 0) return -1;
-    add_p2p_share_entry(run.entries);
+    if (cycle_begin(&run, CYCLE_P2PEN) < 0) return -1;
+    if (add_p2p_share_entry(&run) != 0) return cycle_abort(&run);
     return cycle_finish(&run);
 }
 
 int webdav_amule_share() {
     CycleRun run;
-    if (cycle_begin(&run, download_share_variant(), -1) < 0) return -1;
-    add_amule_share_entry(run.entries);
+    if (cycle_begin(&run, CYCLE_AMULEN) < 0) return -1;
+    if (add_amule_share_entry(&run) != 0) return cycle_abort(&run);
     return cycle_finish(&run);
 }

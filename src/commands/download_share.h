@@ -4,16 +4,11 @@
 #ifndef DAVSYNC_COMMANDS_DOWNLOAD_SHARE_H
 #define DAVSYNC_COMMANDS_DOWNLOAD_SHARE_H
 
-#include "shares/dav_share_list.h"
-
 int webdav_p2p_share();
 int webdav_amule_share();
-// Volume index (letter - 'a') of the entry added, or -1 when none was.
-int add_p2p_share_entry(DavShareEntry *entries);
-int add_amule_share_entry(DavShareEntry *entries);
-// Volume index of the p2p download location in the settings file, or -1.
-// The _in form reads the given file.
-int read_p2p_save_volume();
-int read_p2p_save_volume_in(const char *file_path);
+// Volume index (letter - 'a') of the p2p download location named in the
+// settings text, or -1. The text is scanned in pieces of at most 1,023 bytes
+// that end at a newline, as the settings file's other readers do.
+int p2p_save_volume_in_text(const char *text);
 
 #endif

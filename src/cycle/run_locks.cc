@@ -2,13 +2,15 @@
 
 #include <cerrno>
 #include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
+#include <syslog.h>
 #include <unistd.h>
 
 #include "base/appliance_paths.h"
 #include "base/safe_file.h"
 
-// A planted object that cannot be removed (a folder) ends the attempts.
+// Something planted again as soon as it is cleared ends the attempts.
 static const int PLANTED_OBJECT_ATTEMPTS = 3;
 
 static int set_whole_file_lock(int fd, short type) {
@@ -32,31 +34,49 @@ static bool still_named_by_path(int fd) {
     return held.st_dev == named.st_dev && held.st_ino == named.st_ino;
 }
 
-// Our lock files are always this user's regular files; anything else at
-// the name was planted and goes. Our own file is never removed here: another
-// run may hold it.
-static bool is_planted(const char *path) {
-    struct stat status;
-    return lstat(path, &status) == 0 &&
-           (!S_ISREG(status.st_mode) || status.st_uid != geteuid());
+// Our mark files are always this user's regular files; anything else at the
+// name was planted and goes, a folder with everything in it (nothing in it
+// followed).
+static int clear_planted(int tmp_fd, const char *name, const char *command) {
+    if (remove_tree_at(tmp_fd, name) != 0) return errno == ENOENT ? 0 : -1;
+    log_event(LOG_WARNING, "%s: cleared what another user planted at /tmp/%s", command, name);
+    return 0;
 }
 
-static int open_node_lock_file() {
-    for (int attempt = 0; attempt < PLANTED_OBJECT_ATTEMPTS; ++attempt) {
-        int fd = open_own_regular(NODE_LOCK_FILE, O_RDWR | O_CREAT, 0644);
-        if (fd != -1) return fd;
-        if (!is_planted(NODE_LOCK_FILE) || unlink(NODE_LOCK_FILE) != 0) return -1;
+// Makes the mark file, clearing what was planted at its name. Runs do this
+// one at a time (under a flock on /tmp itself), so that no run ever clears a
+// mark file another has just made.
+static int make_mark_file(const char *path, int flags, const char *command) {
+    int tmp_fd = open("/tmp", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (tmp_fd == -1) return -1;
+    int fd = -1;
+    if (flock(tmp_fd, LOCK_EX) == 0) {
+        const char *name = path + sizeof "/tmp";
+        for (int attempt = 0; attempt < PLANTED_OBJECT_ATTEMPTS && fd == -1; ++attempt) {
+            fd = open_own_regular(path, flags | O_CREAT, 0644);
+            if (fd == -1 && (errno == EIO || errno == ENOSPC || clear_planted(tmp_fd, name, command) != 0)) break;
+        }
     }
-    return -1;
+    int error = errno;
+    close(tmp_fd);  // and with it the flock
+    errno = error;
+    return fd;
 }
 
-int lock_node_file() {
+// The mark file as it is, or made anew.
+static int open_mark_file(const char *path, int flags, const char *command) {
+    int fd = open_own_regular(path, flags, 0);
+    return fd != -1 ? fd : make_mark_file(path, flags, command);
+}
+
+int lock_node_file(const char *command, RunFailure *failure) {
     for (;;) {
-        int fd = open_node_lock_file();
-        if (fd == -1) return -1;
+        int fd = open_mark_file(NODE_LOCK_FILE, O_RDWR, command);
+        if (fd == -1) return note_failure(failure, "cannot take the run lock", NODE_LOCK_FILE, errno);
         if (set_whole_file_lock(fd, F_WRLCK) == -1) {
+            int error = errno;
             close(fd);
-            return -1;
+            return note_failure(failure, "cannot take the run lock", NODE_LOCK_FILE, error);
         }
         if (still_named_by_path(fd)) return fd;
         close(fd);
@@ -64,20 +84,26 @@ int lock_node_file() {
 }
 
 void unlock_node_file(int fd) {
+    if (fd == -1) return;
     // Unlinking while the lock is still held keeps the file and the lock in step
     // for the runs that wait on it.
-    unlink(NODE_LOCK_FILE);
-    if (fd == -1) return;
+    if (unlink(NODE_LOCK_FILE) != 0) log_event(LOG_WARNING, "cannot remove %s: %m", NODE_LOCK_FILE);
     set_whole_file_lock(fd, F_UNLCK);
     close(fd);
 }
 
-void start_lock_wait_and_mark() {
+void start_lock_wait_and_mark(const char *command) {
     if (access(START_LOCK_FILE, F_OK) == 0) {
         sleep(1);
         sleep(1);
     }
-    touch_own_file(START_LOCK_FILE);
+    int fd = open_mark_file(START_LOCK_FILE, O_WRONLY, command);
+    if (fd == -1 || futimens(fd, nullptr) != 0)
+        log_event(LOG_WARNING, "%s: cannot mark %s: %m", command, START_LOCK_FILE);
+    if (fd != -1) close(fd);
 }
 
-void start_lock_clear() { unlink(START_LOCK_FILE); }
+void start_lock_clear() {
+    if (unlink(START_LOCK_FILE) != 0 && errno != ENOENT)
+        log_event(LOG_WARNING, "cannot remove %s: %m", START_LOCK_FILE);
+}

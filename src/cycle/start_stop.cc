@@ -2,21 +2,12 @@
 
 #include "cycle/regeneration.h"
 
-int webdav_start() {
+static int run_cycle(CycleCommand command) {
     CycleRun run;
-    if (cycle_begin(&run, start_variant(), -1) < 0) return -1;
+    if (cycle_begin(&run, command) < 0) return -1;
     return cycle_finish(&run);
 }
 
-// WebDAV off without touching its setting: everything rewritten as disabled
-// (so no link is made) and the server stopped.
-int webdav_stop() {
-    CycleVariant variant = start_variant();
-    variant.wait_start_lock = false;
-    variant.read_enable_flag = false;
-    variant.rule = RECONCILE_NAME_AND_PATH;
-    variant.allen = ALLEN_ZERO;
-    CycleRun run;
-    if (cycle_begin(&run, variant, -1) < 0) return -1;
-    return cycle_finish(&run);
-}
+int webdav_start() { return run_cycle(CYCLE_START); }
+
+int webdav_stop() { return run_cycle(CYCLE_STOP); }

@@ -23,23 +23,6 @@ static bool is_open_share(const ShareRecord *rules) {
            strstr(rules->public_, "yes") != nullptr || rules->web_public == 1;
 }
 
-static NameNode *expand_field(GroupTable *groups, const char *list_text) {
-    NameNode *names = nullptr;
-    if (list_text[0] != '\0') expand_user_list_with(groups, list_text, &names);
-    return names;
-}
-
-static void remove_invalid(NameNode *names, const NameIndex *invalid) {
-    for (NameNode *node = names; node != nullptr; node = node->next)
-        if (node->name[0] != '\0' && name_index_find(invalid, node->name) != nullptr)
-            memset(node->name, 0, sizeof node->name);
-}
-
-static void index_names(NameIndex *index, NameNode *names) {
-    for (NameNode *node = names; node != nullptr; node = node->next)
-        if (node->name[0] != '\0') (void)name_index_add(index, node->name, node);
-}
-
 // Appends a name and its space at `used`; false, leaving the line as it
 // was, when they do not fit.
 static bool append_user(char (&line)[LINE_BUFFER_WIDTH], size_t *used, const char *name) {
@@ -51,30 +34,38 @@ static bool append_user(char (&line)[LINE_BUFFER_WIDTH], size_t *used, const cha
     return true;
 }
 
-// Each name is followed by one space; names that no longer fit the line are
-// left off, the line stops at the last one that does.
-static void write_user_line(FILE *conf, const NameNode *first, const NameNode *second) {
+// Each name not refused is followed by one space; names that no longer fit
+// the line are left off, the line stops at the last one that does.
+static void write_user_line(FILE *conf, const NameArray *first, const NameArray *second,
+                            const NameIndex *refused) {
     char line[LINE_BUFFER_WIDTH];
     size_t used = 0;
     append_user(line, &used, "\t\tRequire user");
-    const NameNode *lists[] = {first, second};
+    const NameArray *lists[] = {first, second};
     bool full = false;
-    for (const NameNode *list : lists)
-        for (const NameNode *node = list; node != nullptr && !full; node = node->next)
-            full = node->name[0] != '\0' && !append_user(line, &used, node->name);
+    for (const NameArray *list : lists)
+        for (size_t i = 0; list != nullptr && i < list->count && !full; ++i)
+            full = name_index_find(refused, list->names[i]) == nullptr && !append_user(line, &used, list->names[i]);
     line[used] = '\n';
     fwrite(line, 1, used + 1, conf);
 }
 
-static void write_authenticated_block(FILE *conf, GroupTable *groups, const ShareRecord *rules) {
-    NameNode *invalid = expand_field(groups, rules->invalid_users);
-    NameNode *readers = expand_field(groups, rules->read_list);
-    NameNode *writers = expand_field(groups, rules->write_list);
-    NameIndex invalid_names = {};
-    index_names(&invalid_names, invalid);
-    remove_invalid(readers, &invalid_names);
-    remove_invalid(writers, &invalid_names);
-    name_index_free(&invalid_names);
+static int expand_field(GroupTable *groups, const char *list_text, NameArray *names) {
+    if (list_text[0] != '\0') return expand_user_names(groups, list_text, names);
+    *names = NameArray{};
+    return 0;
+}
+
+// The readers and writers less the refused (invalid) users, whose names the
+// group table's scratch index holds while the lines are written.
+static int write_authenticated_block(FILE *conf, GroupTable *groups, const ShareRecord *rules) {
+    NameArray invalid, readers, writers;
+    int result = expand_field(groups, rules->invalid_users, &invalid);
+    result |= expand_field(groups, rules->read_list, &readers);
+    result |= expand_field(groups, rules->write_list, &writers);
+    name_index_clear(&groups->seen);
+    for (size_t i = 0; i < invalid.count; ++i)
+        if (name_index_add(&groups->seen, invalid.names[i], const_cast<char *>(invalid.names[i])) < 0) result = -1;
 
     fputs("\tAuthType Basic\n"
           "\tAuthName DAV-upload\n"
@@ -82,23 +73,24 @@ static void write_authenticated_block(FILE *conf, GroupTable *groups, const Shar
           "\n"
           "\t<Limit GET HEAD PROPFIND OPTIONS>\n",
           conf);
-    write_user_line(conf, readers, writers);
+    write_user_line(conf, &readers, &writers, &groups->seen);
     fputs("\t</Limit>\n"
           "\n"
           "\t<LimitExcept GET PROPFIND HEAD OPTIONS>\n",
           conf);
-    write_user_line(conf, writers, nullptr);
+    write_user_line(conf, &writers, nullptr, &groups->seen);
     fputs("\t</LimitExcept>\n"
           "\n",
           conf);
 
-    free_name_list(invalid);
-    free_name_list(readers);
-    free_name_list(writers);
+    free_name_array(&invalid);
+    free_name_array(&readers);
+    free_name_array(&writers);
+    return result == 0 ? 0 : -1;
 }
 
-void write_share_section(FILE *conf, GroupTable *groups, const char *shared_name, bool dav_on,
-                         const ShareRecord *rules) {
+int write_share_section(FILE *conf, GroupTable *groups, const char *shared_name, bool dav_on,
+                        const ShareRecord *rules) {
     char line[LINE_BUFFER_WIDTH];
     format_text_field(line, sizeof line, "Alias \"/%s\" \"%s/%s\"\n", shared_name, LINK_DIR,
                       shared_name);
@@ -111,11 +103,13 @@ void write_share_section(FILE *conf, GroupTable *groups, const char *shared_name
           "\tOrder Allow,Deny\n"
           "\tAllow from all\n",
           conf);
+    int result = 0;
     if (rules == nullptr || is_open_share(rules))
         fputs("\tAuthType None\n", conf);
     else
-        write_authenticated_block(conf, groups, rules);
+        result = write_authenticated_block(conf, groups, rules);
     fputs("</Directory>\n"
           "\n",
           conf);
+    return result;
 }

@@ -18,8 +18,8 @@ bool is_conf_safe_name(const char *shared_name);
 // open access block; otherwise the block follows the share's lists: open
 // when a list names allaccount, public holds "yes" or web_public is 1, else
 // authenticated with the readers and writers less the invalid users.
-// Groups come from `groups`.
-void write_share_section(FILE *conf, GroupTable *groups, const char *shared_name, bool dav_on,
+// Groups come from `groups`. 0, or -1 when memory ran out on the way.
+int write_share_section(FILE *conf, GroupTable *groups, const char *shared_name, bool dav_on,
                          const ShareRecord *rules);
 
 #endif

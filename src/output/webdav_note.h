@@ -6,7 +6,7 @@
 #include <cstdio>
 
 #include "output/conf_build.h"
-#include "shares/dav_share_list.h"
+#include "shares/dav_share_entry.h"
 
 // The note is to be written anew: the name of every entry whose path is not
 // empty, into build->note.

@@ -47,7 +47,11 @@ static bool copy_all(int from, int to) {
 // The folder exists afterwards; a new one gets 0755 whatever the umask.
 static bool make_hidden_folder(const char *folder) {
     if (mkdir(folder, 0755) == 0) return chmod(folder, 0755) == 0;
-    return errno == EEXIST;
+    if (errno != EEXIST) return false;
+    struct stat status;
+    if (stat(folder, &status) == 0 && S_ISDIR(status.st_mode)) return true;
+    errno = ENOTDIR;
+    return false;
 }
 
 // Copies `file` to `temporary` (a mkstemp template, filled in) and flushes it.
@@ -60,9 +64,14 @@ static bool write_temporary_copy(const char *file, char *temporary) {
         return false;
     }
     bool stored = copy_all(from, to) && fchmod(to, 0644) == 0 && fsync(to) == 0;
+    int error = errno;
     close(from);
-    stored = close(to) == 0 && stored;
+    if (close(to) != 0 && stored) {
+        stored = false;
+        error = errno;
+    }
     if (!stored) unlink(temporary);
+    errno = error;
     return stored;
 }
 
@@ -75,13 +84,17 @@ int saveDataToHiddenByVolume(const char *file, const char *volume_dir) {
     char *final_name = hidden_path(volume_dir, base, "");
     char *temporary = hidden_path(volume_dir, base, ".XXXXXX");
     int result = -1;
+    int error = ENOMEM;
     if (folder != nullptr && final_name != nullptr && temporary != nullptr &&
         make_hidden_folder(folder) && write_temporary_copy(file, temporary)) {
         if (rename(temporary, final_name) == 0) result = 0;
-        else unlink(temporary);
+        else error = errno, unlink(temporary);
+    } else if (folder != nullptr && final_name != nullptr && temporary != nullptr) {
+        error = errno;
     }
     free(folder);
     free(final_name);
     free(temporary);
+    errno = error;
     return result;
 }

@@ -9,7 +9,7 @@ extern "C" {
 char *getDataLocationByVolume(const char *name, const char *volume_dir);
 // Stores a copy of `file` in the volume's hidden data location under the
 // file's base name, atomically (temporary name, fsync, rename); creates the
-// location (0755) when absent. 0, or -1 with the old copy untouched.
+// location (0755) when absent. 0, or -1 (errno set) with the old copy untouched.
 int saveDataToHiddenByVolume(const char *file, const char *volume_dir);
 }
 

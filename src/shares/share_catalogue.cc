@@ -5,8 +5,9 @@
 #include <cstring>
 #include <iterator>
 #include <libxml/parser.h>
-#include <unistd.h>
+#include <cerrno>
 
+#include "base/file_read.h"
 #include "base/record_list.h"
 #include "base/text_field.h"
 #include "shares/xml_helpers.h"
@@ -14,7 +15,6 @@
 namespace {
 
 constexpr char SYSTEM_CATALOGUE[] = "/var/www/xml/smb.xml";
-constexpr size_t CATALOGUE_PATH_WIDTH = 4096;
 
 enum class FieldKind { number, text, recovered_text };
 
@@ -177,30 +177,36 @@ int read_items(xmlDoc *doc, ShareRecord *head) {
     return result;
 }
 
-int read_catalogue(ShareRecord *head, const char *file_path) {
-    if (head == nullptr || file_path == nullptr) return -1;
-    if (strnlen(file_path, CATALOGUE_PATH_WIDTH) >= CATALOGUE_PATH_WIDTH) return -1;
-    if (access(file_path, F_OK) != 0) return -1;
+}  // namespace
+
+int read_share_catalogue_text(ShareRecord *head, const char *text, size_t length) {
+    if (head == nullptr) return -1;
     quiet_xml_errors();
-    xmlDoc *doc = xmlReadFile(file_path, nullptr, XML_PARSE_NOBLANKS | XML_PARSE_NODICT);
+    // What follows a NUL byte is no text of the file.
+    xmlDoc *doc = xmlReadMemory(text, static_cast<int>(strnlen(text, length)), nullptr, nullptr,
+                                XML_PARSE_NOBLANKS | XML_PARSE_NODICT | XML_PARSE_NONET);
     if (doc == nullptr) return -1;
     int result = read_items(doc, head);
     free_xml_memory(doc);
     return result;
 }
 
-}  // namespace
+int read_share_catalogue(ShareRecord *head, RunFailure *failure) {
+    FileBytes bytes = {};
+    FileState state = read_whole_file(SYSTEM_CATALOGUE, &bytes, READ_PLAIN);
+    if (state == FileState::failed) return note_failure(failure, "cannot read", SYSTEM_CATALOGUE, errno);
+    if (state != FileState::read) return note_failure(failure, "there is no share catalogue", SYSTEM_CATALOGUE, 0);
+    int result = read_share_catalogue_text(head, bytes.data, bytes.length);
+    free_file_bytes(&bytes);
+    if (result != 0) return note_failure(failure, "cannot use the share catalogue", SYSTEM_CATALOGUE, 0);
+    return 0;
+}
+
 
 ShareRecord *new_share_record() {
     ShareRecord *record = new_zeroed_record<ShareRecord>();
     if (record != nullptr) adopt_texts(record, nullptr);
     return record;
-}
-
-int read_share_catalogue(ShareRecord *head) { return read_catalogue(head, SYSTEM_CATALOGUE); }
-
-int read_share_catalogue_file(ShareRecord *head, const char *file_path) {
-    return read_catalogue(head, file_path);
 }
 
 void free_share_catalogue(ShareRecord *head) {

@@ -14,6 +14,8 @@
 
 #include <cstddef>
 
+#include "base/diagnostics.h"
+
 constexpr size_t ACCESS_LIST_WIDTH = 55296;
 
 struct ShareRecord {
@@ -39,11 +41,13 @@ struct ShareRecord {
 // An empty record (every text "", every number 0) with a null next, or null
 // when memory is exhausted.
 [[nodiscard]] ShareRecord *new_share_record();
-// Read the catalogue into the list at a fresh `head`. 0 on success, also
-// when <samba> holds no <item>; -1 for a null head, a missing or unparsable
-// file, no root or no <samba>, or memory exhausted (records read so far stay).
-int read_share_catalogue(ShareRecord *head);
-int read_share_catalogue_file(ShareRecord *head, const char *file_path);
+// Reads /var/www/xml/smb.xml whole into the list at a fresh `head`. 0 on
+// success, also when <samba> holds no <item>; -1 with the failure noted when
+// the file is missing, cannot be read, does not parse, has no root or no
+// <samba>, or memory runs out (records read so far stay).
+int read_share_catalogue(ShareRecord *head, RunFailure *failure);
+// The same from a catalogue's text (read up to its first NUL byte): 0, or -1.
+int read_share_catalogue_text(ShareRecord *head, const char *text, size_t length);
 // Clears and frees every record from head along next; null does nothing.
 void free_share_catalogue(ShareRecord *head);
 

@@ -8,7 +8,7 @@
 
 #include <cstddef>
 
-#include "shares/dav_share_list.h"
+#include "shares/dav_share_entry.h"
 #include "shares/share_catalogue.h"
 
 struct ShareByPath {

@@ -77,3 +77,25 @@ void quiet_xml_errors() {
     xmlSetGenericErrorFunc(nullptr, ignore_xml_error);
     xmlSetStructuredErrorFunc(nullptr, nullptr);
 }
+
+int escape_xml_text(const char *text, char *out) {
+    if (text == nullptr || out == nullptr) return -1;
+    if (strnlen(text, XML_ESCAPE_INPUT_MAX + 1) > XML_ESCAPE_INPUT_MAX) return -1;
+    char work[XML_ESCAPE_WIDTH];
+    size_t used = 0;
+    for (const char *at = text; *at != '\0'; ++at) {
+        char single[2] = {*at, '\0'};
+        const char *piece = *at == '&'   ? "&amp;"
+                            : *at == '<' ? "&lt;"
+                            : *at == '>' ? "&gt;"
+                            : *at == '"' ? "&quot;"
+                                         : single;
+        size_t length = strlen(piece);
+        if (used + length > sizeof work - 1) return -1;
+        memcpy(work + used, piece, length);
+        used += length;
+    }
+    work[used] = '\0';
+    copy_text_field(out, XML_ESCAPE_WIDTH, work);
+    return 0;
+}

@@ -1,4 +1,4 @@
-// Small libxml2 helpers shared by the catalogue and share list readers. The
+// Small XML helpers shared by the readers and writers of the XML files. The
 // first three are also offered, under these C names, to the appliance's
 // libraries loaded with the executable.
 #ifndef DAVSYNC_SHARES_XML_HELPERS_H
@@ -27,6 +27,14 @@ xmlNode *find_xml_child(xmlNode *parent, const xmlChar *name, char *buffer, size
 inline const xmlChar *xml_name(const char *name) {
     return reinterpret_cast<const xmlChar *>(name);
 }
+
+constexpr int XML_ESCAPE_INPUT_MAX = 512;
+constexpr int XML_ESCAPE_WIDTH = 1024;
+
+// XML-escapes & < > " into `out` (XML_ESCAPE_WIDTH characters); the
+// apostrophe stays. -1 when text is longer than 512 characters or the result
+// would not fit; out is then unchanged.
+int escape_xml_text(const char *text, char *out);
 
 // Keeps libxml2 from printing parse errors: the tool prints nothing but its
 // usage text, and a reader's result already tells a broken file.
