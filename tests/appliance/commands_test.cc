@@ -56,12 +56,14 @@ const Row ROWS[] = {
      {{list_of(A2), share_list_xml(0, {{"Volume", "/"}, {"Public", "/Public"}, {"Music", "/Music", 0, 1}})}}, DO,
      {"stop dav"}},
     {"do with a broken input file", [](Appliance &box) { box.write("/tmp/input.xml", "<config><WebDAV><item>"); },
-     untouched_but({{CONF, GONE}, {"/tmp/corvane.node", GONE}}), DO, {}},
+     untouched_but({{CONF, GONE}, {"/tmp/corvane.node", GONE}}), DO, {}, 0,
+     {"do: the input is no share list: /tmp/input.xml; nothing was changed"}},
     {"del with a trailing slash", WHOLE_VOLUME,
      untouched_but({{list_of(A2), share_list_xml(1, {{"Public", "/Public"}, {"Whole", "/"}})}}), {"del", A2 + "/Music/"}},
     {"del of a volume root", WHOLE_VOLUME,
      {{list_of(A2), share_list_xml(1, {{"Public", "/Public"}, {"Music", "/Music", 0, 1}})}}, {"del", A2}},
-    {"del of an unknown path", nullptr, untouched_but({{CONF, GONE}}), {"del", A2 + "/Pub"}, {}},
+    {"del of an unknown path", nullptr, untouched_but({{CONF, GONE}}), {"del", A2 + "/Pub"}, {}, 0,
+     {"del: no share is published at /mnt/HD/HD_a2/Pub; nothing was changed"}},
     {"del of the only entry empties the list",
      [](Appliance &box) {
          box.write("/etc/mtab", "/dev/sda4 " + A2 + " ext4 rw 0 0\n");
@@ -93,6 +95,12 @@ const Row ROWS[] = {
                                        {"Musix", "/Musix"}})},
       {list_of(D2), share_list_xml(1, D2_ITEMS)}},
      {"chg", A2 + "/Music", A2 + "/Songs"}},
+    {"chg re-points the link of a name with a dot; stale dot names go",
+     with({{".pub", A2 + "/Music", "", "", "", "yes"}, {".pub", A2 + "/Songs", "", "", "", "yes"}}, {}, [](Appliance &box) {
+         box.write_list(A2, {{".pub", "/Music"}}, 7);
+         box.plant_link(A2 + "/Music", LINKS + "/.pub"), box.plant_link("/etc", LINKS + "/.old");
+     }),
+     {{LINKS + "/.pub", "-> " + A2 + "/Songs"}, {LINKS + "/.old", GONE}}, {"chg", A2 + "/Music", A2 + "/Songs"}},
     {"chg of a folder that is gone moves nothing",
      with({open_share(A2 + "/Songs")}, {}, [](Appliance &box) { box.remove(A2 + "/Public"); }),
      {{list_of(A2), share_list_xml(1, {{"Music", "/Music", 0, 1}})}}, {"chg", A2 + "/Public", A2 + "/Songs"}},

@@ -64,9 +64,9 @@ const Row ROWS[] = {
     {"another start under way: two seconds", [](Appliance &box) { box.write("/tmp/corvane_start_lock", ""); },
      {{"/tmp/corvane_start_lock", GONE}}, {"start"}, {"restart dav"}, 2.0},
     {"no data volume", [](Appliance &box) { box.write("/etc/mtab", "/dev/sdc1 /mnt/USB/USB1 vfat rw 0 0\n"); },
-     NOTHING_CHANGED, {"start"}, {}},
+     NOTHING_CHANGED, {"start"}, {}, 0, {"start: no data volume is mounted; nothing was changed"}},
     {"catalogue without samba", [](Appliance &box) { box.write("/var/www/xml/smb.xml", "<config/>"); }, NOTHING_CHANGED,
-     {"start"}, {}},
+     {"start"}, {}, 0, {"start: cannot use the share catalogue /var/www/xml/smb.xml; nothing was changed"}},
     {"get", for_get, {{QUERY, answer("Public", A2 + "/Public")}}, {"get", A2 + "/Public"}, {}},
     {"get in a list padded with NULs, as a crash can leave it",
      [](Appliance &box) { box.write(list_of(A2), share_list_xml(7, {{"Public", "/Public"}}) + std::string(99, '\0')); },
@@ -82,7 +82,8 @@ const Row ROWS[] = {
     {"get with WebDAV off", get_off, {{QUERY, GONE}}, {"get", A2 + "/Public"}, {}},
     {"get USB with WebDAV off", get_off, {{QUERY, answer("USB1/", "/mnt/USB/USB1/")}},
      {"get", "/mnt/USB/USB1/"}, {}},
-    {"get without volumes", [](Appliance &box) { get_off(box), box.write("/etc/mtab", ""); }, {{QUERY, EARLIER}}, {"get", A2 + "/Public"}, {}},
+    {"get without volumes", [](Appliance &box) { get_off(box), box.write("/etc/mtab", ""); }, {{QUERY, EARLIER}}, {"get", A2 + "/Public"}, {},
+     0, {"get: no data volume is mounted; no answer was written"}},
 };
 
 class StartStopGet : public testing::TestWithParam<Row> {};

@@ -105,6 +105,14 @@ inline void expect_files(const Appliance &box, const Files &files) {
     for (const auto &[path, want] : files) EXPECT_EQ(found(box, path, want), want) << path;
 }
 
+// Each logged line holds its text of `want`, in order; a normal run logs nothing.
+inline void expect_logged(Appliance &box, const Words &want) {
+    Words lines = box.log_lines();
+    EXPECT_EQ(lines.size(), want.size()) << testing::PrintToString(lines);
+    for (size_t i = 0; i < lines.size() && i < want.size(); ++i)
+        EXPECT_NE(lines[i].find(want[i]), std::string::npos) << lines[i];
+}
+
 // One scenario: the set-up after the family's base, what the command leaves.
 struct Row {
     const char *what;
@@ -113,6 +121,7 @@ struct Row {
     Words command = {"start"};
     Words server_calls = {"restart dav"};
     double at_least_seconds = 0;
+    Words logged = {};
 };
 inline void PrintTo(const Row &row, std::ostream *out) { *out << row.what; }
 
@@ -130,6 +139,7 @@ inline void check(const Row &row, const std::function<void(Appliance &)> &base) 
     EXPECT_EQ(run.out + run.err, "");
     expect_files(box, row.files);
     EXPECT_EQ(box.apache_calls(), row.server_calls);
+    expect_logged(box, row.logged);
 }
 
 }  // namespace fixture

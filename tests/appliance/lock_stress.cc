@@ -13,7 +13,9 @@ int main(int argc, char **argv) {
     for (unsigned seed = 1; seed <= unsigned(processes); ++seed) {
         if (fork() != 0) continue;
         for (int round = 0; round < rounds; ++round) {
-            int lock = lock_node_file();
+            RunFailure failure = {};
+            int lock = lock_node_file("stress", &failure);
+            if (lock == -1) _exit(1);
             int marker = open("/tmp/lock_stress.inside", O_WRONLY | O_CREAT | O_EXCL, 0600);
             if (marker == -1) _exit(1);
             usleep(rand_r(&seed) % 200), close(marker), unlink("/tmp/lock_stress.inside");

@@ -68,7 +68,6 @@ TEST(Safety, ItemsOutsideTheVolumeFoldersAndLinksOnAUsbVolumeAreNotFollowed) {
     box.write("/etc/.davconf", "keep");
     box.mount_usb("USB2", false);
     box.plant_link(VICTIM, "/mnt/USB/USB2/.davconf");
-    box.plant_link("/etc", LINKS);  // emptying it would empty /etc
     box.write(VICTIM, "keep");
     box.write("/tmp/in.xml", share_list_xml(1, {{"Root", "/"}, {"Root2", A2 + "/../../etc"}, {"Root3", "/etc"},
                                                  {"Root4", "/mnt/HD/HD_A2/x"}, {"Sub", "/mnt/USB/USB1/sub"},
@@ -81,17 +80,43 @@ TEST(Safety, ItemsOutsideTheVolumeFoldersAndLinksOnAUsbVolumeAreNotFollowed) {
     EXPECT_NE(box.read(CONF).find(section("Public", "On", OPEN)), std::string::npos);
 }
 
-// A list the parser rejects stays byte for byte and its entries come back
-// once it reads again; a list whose layout is wrong is rewritten.
-TEST(Safety, AStoredListThatDoesNotParseIsKept) {
-    for (const std::string broken : {"", "<?xml version=\"1.0\"?>\n<config>\n\t<WebDAV>\n\t\t<count>2",
-                                     "\xff\xfe not xml"}) {
+// Emptying a link planted as the link directory would empty its target, and
+// a share named like a file there would serve it: the run stops first.
+TEST(Safety, ALinkPlantedAsTheLinkDirectoryStopsTheRun) {
+    Appliance box;
+    realistic(box);
+    box.plant_link("/etc", LINKS);
+    box.write("/etc/keep", "keep");
+    expect_quiet(box.run({"start"}));
+    expect_files(box, {{"/etc/keep", "keep"}, {CONF, GONE}});
+    expect_logged(box, {"start: cannot use the link directory /usr/local/apache2_dav/webdav: Too many levels"});
+    EXPECT_EQ(box.apache_calls(), Words{});
+}
+
+// A list the reader refuses, whatever the reason, stays byte for byte, is
+// told and contributes nothing; an edit that would store entries in its place
+// changes nothing; once it reads again its entries come back.
+TEST(Safety, AListTheReaderRefusesIsKept) {
+    const std::string list = "<?xml version=\"1.0\"?>\n<config>\n\t<WebDAV>\n", end = "</WebDAV></config>\n",
+                      counts = "<count>1</count><allen>1</allen>",
+                      item = "<item><shared_name>Public</shared_name><path>/Public</path></item>";
+    for (const std::string &refused :
+         {std::string(), list + "\t\t<count>2", std::string("\xff\xfe not xml"), list + "<!-- x -->" + counts + item + end,
+          list + "<?pi x?>" + counts + item + end, list + item + counts + end, list + "<count>1</count>" + item + end,
+          "<!DOCTYPE c>" + list + counts + item + end, "<config>text" + list.substr(list.find("\t<")) + counts + end}) {
+        SCOPED_TRACE(refused);
         Appliance box;
         realistic(box);
-        box.write(A2_LIST, broken);
+        box.write(A2_LIST, refused);
+        box.write("/tmp/in.xml", share_list_xml(1, {{"Photos", A2 + "/Photos"}}));
         expect_quiet(box.run({"start"}));
-        EXPECT_EQ(box.read(A2_LIST), broken);
-        EXPECT_EQ(box.read(CONF).find("Public"), std::string::npos);
+        std::string conf = box.read(CONF);
+        EXPECT_EQ(conf.find("Public"), std::string::npos);
+        EXPECT_NE(conf.find("Backup"), std::string::npos);
+        expect_quiet(box.run({"do", "/tmp/in.xml"}));
+        expect_files(box, {{A2_LIST, refused}, {CONF, conf}});
+        expect_logged(box, {"start: cannot use " + A2_LIST, "do: cannot use " + A2_LIST,
+                            "do: cannot store entries in a list left as it is: " + A2_LIST + "; nothing was changed"});
         box.write_list(A2, A2_ITEMS, 7);
         expect_quiet(box.run({"start"}));
         expect_files(box, clean_start());
@@ -111,19 +136,23 @@ TEST(Safety, ANameCutAtItsWidthStaysReadable) {
 }
 
 // With /tmp full the lists cannot be staged, with a volume full they cannot
-// be stored: none is stored in part, and the configuration is complete.
-TEST(Safety, AFullTmpOrVolumeLosesNothingStored) {
-    Appliance box;
-    realistic(box);
-    Files before = stored(box);
-    before.erase(before.begin());  // no configuration yet
-    box.write("/tmp/filler", std::string(64 * 1024, 'f')), box.write(B2 + "/filler", std::string(64 * 1024, 'f'));
-    expect_quiet(box.run({"start"}, RunOptions{{{"/tmp", "64k"}}}));
-    expect_files(box, before);
-    EXPECT_EQ(box.read(CONF), clean_start()[0].second);
-    box.remove(CONF);
-    expect_quiet(box.run({"start"}, RunOptions{{{B2, "64k"}}}));
-    EXPECT_EQ(box.read(CONF), clean_start()[0].second);
+// be stored: then neither list nor configuration changes (the configuration
+// would publish a share its list still holds, or drop one it holds), and the
+// failure is told.
+TEST(Safety, AListThatCannotBeStoredChangesNothing) {
+    // The fillers leave no page of the 64k free beside what is there already.
+    for (const auto &[full, filler_kb] : {std::make_pair(std::string("/tmp"), 60), std::make_pair(B2, 56)}) {
+        SCOPED_TRACE(full);
+        Appliance box;
+        realistic(box);
+        box.run({"start"});
+        Files before = stored(box);
+        box.write(full + "/filler", std::string(filler_kb * 1024, 'f'));
+        expect_quiet(box.run({"del", B2 + "/Backup"}, RunOptions{{{full, "64k"}}}));
+        expect_files(box, before);
+        expect_logged(box, {"del: cannot "});
+        EXPECT_EQ(box.apache_calls(), Words{"restart dav"});
+    }
 }
 
 // Killed at any moment, a run leaves each list as it was or as a whole run
@@ -142,6 +171,8 @@ TEST(Safety, AKilledRunLeavesOldOrNewAndTheNextStartCompletes) {
             EXPECT_TRUE(now[i].second == old[i].second || now[i].second == clean_start()[i].second) << now[i].first << trial;
         expect_quiet(box.run({"start"}));
         expect_files(box, clean_start());
+        expect_files(box, {{A2 + "/.system_data/", "lighty.xml lighty_iso.xml"}, {B2 + "/.system_data/", "lighty.xml lighty_iso.xml"},
+                           {"/usr/local/apache2_dav/conf/extra/", "httpd-dav.conf"}, {"/tmp/", "set_webdav_note"}});
     }
 }
 
@@ -156,6 +187,7 @@ TEST(Safety, ConcurrentRunsLoseNoEditAndLeaveNoMark) {
         box.write("/tmp/" + name, share_list_xml(1, {{name, A2 + "/" + name}}));
     }
     publish(box, shares);
+    box.write("/tmp/corvane.node/planted/file", "x");  // as any local user may
     for (int i = 0; i < 32; ++i) runs.push_back(box.start({"do", "/tmp/New" + std::to_string(i)}));
     for (const Words &words : {Words{"start"}, {"get", A2 + "/Public"}, {"del", B2 + "/Backup"}, {"stop"}, {"du", "x"}})
         runs.push_back(box.start(words));
@@ -163,6 +195,9 @@ TEST(Safety, ConcurrentRunsLoseNoEditAndLeaveNoMark) {
     for (int i = 0; i < 32; ++i)
         EXPECT_NE(box.read(A2_LIST).find("<path>/New" + std::to_string(i) + "</path>"), std::string::npos) << i;
     expect_files(box, {{"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}});
+    Words lines = box.log_lines();
+    EXPECT_FALSE(lines.empty());
+    for (const std::string &line : lines) EXPECT_NE(line.find("cleared what another user planted at /tmp/corvane.node"), line.npos) << line;
 }
 
 // Every file of the root but those the tool writes: its type, size and time.
