@@ -3,8 +3,10 @@
 #include <cstdlib>
 #include <cstring>
 #include <libxml/parser.h>
+#include <libxml/parserInternals.h>
 
 #include "base/text_field.h"
+#include "shares/share_list_layout.h"
 
 namespace {
 
@@ -47,7 +49,9 @@ bool names(const xmlChar *name, const char *wanted) {
     return strcmp(reinterpret_cast<const char *>(name), wanted) == 0;
 }
 
-void stop(ListParser *parser) { xmlStopParser(parser->context); }
+void stop(ListParser *parser) {
+    if (parser->context != nullptr) xmlStopParser(parser->context);
+}
 
 void refuse(ListParser *parser) {
     parser->refused = true;
@@ -109,11 +113,16 @@ void end_field(ListParser *parser) {
     case SHARED_NAME:
         if (overlong || copy_text(item->shared_name, text) != 0) parser->item_spoilt = true;
         break;
-    case PATH:
-        if (overlong || format_text_field(item->path, sizeof item->path, "%s%s",
-                                          parser->request->prefix, text) != 0)
+    case PATH: {
+        size_t prefix = strlen(parser->request->prefix);
+        if (overlong || prefix + parser->text_length >= sizeof item->path) {
             parser->item_spoilt = true;
+            break;
+        }
+        memcpy(item->path, parser->request->prefix, prefix);
+        memcpy(item->path + prefix, text, parser->text_length + 1);
         break;
+    }
     case RW_FIELD: item->RW = to_int(text); break;
     case ENABLE: item->enable = to_int(text); break;
     default: break;
@@ -263,6 +272,74 @@ xmlSAXHandler list_handler() {
     return handler;
 }
 
+void start(ListParser *parser, const char *name) {
+    on_start(parser, reinterpret_cast<const xmlChar *>(name), nullptr, nullptr, 0, nullptr, 0, 0, nullptr);
+}
+
+void end(ListParser *parser) { on_end(parser, nullptr, nullptr, nullptr); }
+
+void element(ListParser *parser, const char *name, const LayoutText &text) {
+    char decoded[FIELD_TEXT_WIDTH + 16];  // one more than a field shows an overlong text
+    start(parser, name);
+    size_t length = decode_layout_text(text, decoded, sizeof decoded);
+    on_text(parser, reinterpret_cast<const xmlChar *>(decoded), static_cast<int>(length));
+    end(parser);
+}
+
+// Whether a look-up for one path can pass the item over: a named item (it
+// does not merge into the next one) with another path changes nothing but
+// empty entries.
+bool passes_over(const ListParser *parser, const LayoutItem &item) {
+    const char *only = parser->request->only_path;
+    if (only == nullptr || item.name.length == 0) return false;
+    size_t prefix = strlen(parser->request->prefix);
+    if (strncmp(only, parser->request->prefix, prefix) != 0) return true;
+    char path[FIELD_TEXT_WIDTH + 16];
+    size_t length = decode_layout_text(item.path, path, sizeof path);
+    return length != strlen(only + prefix) || memcmp(path, only + prefix, length) != 0;
+}
+
+// The nodes of a list in the tool's own layout, as libxml2 would give them
+// (the blank text between elements aside).
+void replay_layout(ListParser *parser, const LayoutScan &scan) {
+    start(parser, "config");
+    start(parser, "WebDAV");
+    element(parser, "count", scan.count);
+    element(parser, "allen", scan.allen);
+    for (size_t i = 0; i < scan.item_count && !parser->out_of_memory; ++i) {
+        const LayoutItem &item = scan.items[i];
+        if (passes_over(parser, item)) continue;
+        start(parser, "item");
+        element(parser, "shared_name", item.name);
+        element(parser, "path", item.path);
+        element(parser, "RW", item.rw);
+        element(parser, "enable", item.enable);
+        end(parser);
+    }
+    end(parser);
+    end(parser);
+}
+
+// Whether libxml2 found the text well-formed; what it read is in `parser`.
+bool parse_with_libxml2(ListParser *parser, const char *text, size_t length) {
+    if (length == 0) return false;  // no document at all
+    parser->context = xmlCreateMemoryParserCtxt(text, static_cast<int>(length));
+    if (parser->context == nullptr) {
+        parser->out_of_memory = true;
+        return false;
+    }
+    *parser->context->sax = list_handler();
+    parser->context->userData = parser;
+    // As the appliance's other readers do: UTF-8, whatever the text declares.
+    xmlCtxtUseOptions(parser->context, XML_PARSE_NONET | XML_PARSE_IGNORE_ENC | XML_PARSE_NODICT);
+    parser->context->encoding = xmlStrdup(reinterpret_cast<const xmlChar *>("UTF-8"));
+    xmlParseDocument(parser->context);
+    bool well_formed = parser->context->wellFormed != 0;
+    xmlFreeParserCtxt(parser->context);
+    parser->context = nullptr;
+    return well_formed;
+}
+
 }  // namespace
 
 ListParse parse_share_list(const char *text, size_t length, const ListRequest &request,
@@ -272,15 +349,12 @@ ListParse parse_share_list(const char *text, size_t length, const ListRequest &r
     parser.request = &request;
     parser.current = entry;
     DavShareEntry original = *entry;
-    xmlSAXHandler handler = list_handler();
-    parser.context = xmlCreatePushParserCtxt(&handler, &parser, nullptr, 0, nullptr);
-    if (parser.context == nullptr) return ListParse::out_of_memory;
-    // As the appliance's other readers do: UTF-8, whatever the text declares.
-    xmlCtxtResetPush(parser.context, nullptr, 0, nullptr, "UTF-8");
-    xmlCtxtUseOptions(parser.context, XML_PARSE_NONET | XML_PARSE_IGNORE_ENC | XML_PARSE_NODICT);
-    xmlParseChunk(parser.context, text, static_cast<int>(strnlen(text, length)), 1);
-    bool well_formed = parser.context->wellFormed != 0;
-    xmlFreeParserCtxt(parser.context);
+    length = strnlen(text, length);
+    LayoutScan scan;
+    bool well_formed = true;
+    if (scan_list_layout(text, length, &scan)) replay_layout(&parser, scan);
+    else well_formed = parse_with_libxml2(&parser, text, length);
+    free_layout_scan(&scan);
 
     ListParse result = parser.out_of_memory             ? ListParse::out_of_memory
                        : !well_formed || parser.refused ? ListParse::refused

@@ -13,6 +13,7 @@
 #include "base/safe_file.h"
 #include "base/text_field.h"
 #include "platform/volume_lib.h"
+#include "shares/share_list_layout.h"
 #include "shares/xml_helpers.h"
 
 namespace {
@@ -52,16 +53,15 @@ int build_list_text(ListWrite *write, const char *directory, MemoryFile *text, i
         }
         if (wanted == 0) continue;
         ++*count;
-        fprintf(items.stream,
-                "\t\t\t<item>\n\t\t\t\t<shared_name>%s</shared_name>\n\t\t\t\t<path>%s</path>\n"
-                "\t\t\t\t<RW>%d</RW>\n\t\t\t\t<enable>%d</enable>\n\t\t\t</item>\n",
-                name, path, entry->RW, entry->enable);
+        const char *const *parts = LAYOUT_ITEM_PARTS;
+        fprintf(items.stream, "%s%s%s%s%s%d%s%d%s", parts[0], name, parts[1], path, parts[2], entry->RW,
+                parts[3], entry->enable, parts[4]);
     }
     bool whole = memory_file_close(&items) == 0;
-    fputs("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<config>\n\t<WebDAV>\n", text->stream);
-    fprintf(text->stream, "\t\t<count>%d</count>\n\t\t<allen>%d</allen>\n", *count, write->allen);
+    const char *const *head = LAYOUT_HEAD_PARTS;
+    fprintf(text->stream, "%s%s%d%s%d%s", LAYOUT_OPEN, head[0], *count, head[1], write->allen, head[2]);
     fwrite(items.text, 1, items.length, text->stream);
-    fputs("\t</WebDAV>\n</config>\n", text->stream);
+    fputs(LAYOUT_CLOSE, text->stream);
     memory_file_free(&items);
     if (memory_file_close(text) == 0 && whole) return 0;
     memory_file_free(text);
