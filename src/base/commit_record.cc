@@ -69,7 +69,7 @@ int apply_step(const ChangeStep *step, const char *command, RunFailure *failure)
     char dir[4096];
     char name[NAME_WIDTH];
     if (split_path(step->path, dir, name) != 0)
-        return note_failure(failure, "cannot apply a change to", step->path, ENAMETOOLONG);
+        return note_failure(failure, "cannot store", step->path, ENAMETOOLONG);
     int dir_fd = open_step_dir(step, dir);
     int result = dir_fd;
     if (dir_fd != -1) {
@@ -114,7 +114,7 @@ int write_record(const ChangeSet *set, RunFailure *failure) {
     MemoryFile text;
     if (record_text(set, &text) != 0) {
         memory_file_free(&text);
-        return note_failure(failure, "cannot build the change record", "", ENOMEM);
+        return note_failure(failure, "cannot make room for the change record", "", ENOMEM);
     }
     int result = stage_file(COMMIT_RECORD_FILE, text.text, text.length, 0600);
     int error = errno;
@@ -188,14 +188,14 @@ int commit_change_set(const ChangeSet *set, const char *command, RunFailure *fai
     // The change is whole; a record left behind would only be applied again,
     // which changes nothing.
     if (unlink(COMMIT_RECORD_FILE) != 0)
-        log_event(LOG_WARNING, "cannot remove the change record %s: %m", COMMIT_RECORD_FILE);
+        log_event(LOG_WARNING, "%s: cannot remove the change record %s: %m", command, COMMIT_RECORD_FILE);
     return 0;
 }
 
 int roll_forward_recorded_change(const char *command, RunFailure *failure) {
     // A record not yet renamed into place belongs to a change never committed.
     if (remove_staged(COMMIT_RECORD_FILE) < 0)
-        return note_failure(failure, "cannot remove the staged change record", COMMIT_RECORD_FILE, errno);
+        return note_failure(failure, "cannot remove what was staged beside", COMMIT_RECORD_FILE, errno);
     FileBytes bytes = {};
     FileState state = read_whole_file(COMMIT_RECORD_FILE, &bytes, READ_NO_LINK);
     if (state == FileState::absent) return 0;

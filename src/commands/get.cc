@@ -39,7 +39,7 @@ static int answer_usb_folder(RunFailure *failure, const char *query_path, DavSha
     char marker[LINE_BUFFER_WIDTH];
     if (format_text_field(marker, sizeof marker, "%s/%s", query_path, USB_MARKER) != 0) return 0;
     int marked = path_exists(marker);
-    if (marked < 0) return note_failure(failure, "cannot tell whether this folder is marked:", query_path, errno);
+    if (marked < 0) return note_failure(failure, "cannot tell whether this volume is marked:", query_path, errno);
     if (marked == 0) return 0;
     copy_text(found->shared_name, usb_folder_name(query_path));
     copy_text(found->path, query_path);

@@ -65,8 +65,8 @@ void free_run_objects(CycleRun *run) {
 }
 
 void release_marks(CycleRun *run) {
-    if (run->variant->clears_start_lock) start_lock_clear();
-    unlock_node_file(run->node_lock);
+    if (run->variant->clears_start_lock) start_lock_clear(command_of(run));
+    unlock_node_file(run->node_lock, command_of(run));
     run->node_lock = -1;
 }
 
@@ -95,7 +95,7 @@ int discard_leftovers(CycleRun *run) {
     removed += found;
     for (const char *path : REPLACED) {
         found = remove_stale_replacements(path);
-        if (found < 0) return note_failure(&run->failure, "cannot clear beside", path, errno);
+        if (found < 0) return note_failure(&run->failure, "cannot clear", path, errno);
         removed += found;
     }
     if (removed > 0)
@@ -149,7 +149,7 @@ int stage_lists(CycleRun *run) {
         break;
     }
     ListWrite write = {run->entries, allen_value(run), run->volumes, run->stored, &run->changes,
-                       &run->failure, {}};
+                       command_of(run), &run->failure, {}};
     int result = stage_share_lists(&write, dirs);
     end_list_staging(&write);
     return result;
@@ -170,7 +170,7 @@ int stage_conf(CycleRun *run, const MemoryFile &conf) {
     if (stage_file(PLACED_CONF_FILE, conf.text, conf.length, 0644) != 0)
         return note_failure(&run->failure, "cannot stage", PLACED_CONF_FILE, errno);
     if (change_set_add(&run->changes, CHANGE_REPLACE, PLACED_CONF_FILE) != 0)
-        return note_failure(&run->failure, "cannot record the change of", PLACED_CONF_FILE, ENOMEM);
+        return note_failure(&run->failure, "cannot make room for the change of", PLACED_CONF_FILE, ENOMEM);
     return 0;
 }
 
@@ -204,10 +204,10 @@ int build(const CycleRun *run, bool directory_service, ConfBuild *conf) {
 }
 
 // The steps of a change that was never committed leave no staged file.
-void discard_staged(const ChangeSet *changes) {
+void discard_staged(const ChangeSet *changes, const char *command) {
     for (const ChangeStep *step = changes->first; step != nullptr; step = step->next)
         if (step->kind != CHANGE_UNMARK && remove_staged(step->path) < 0)
-            log_event(LOG_WARNING, "cannot remove what was staged beside %s: %m", step->path);
+            log_event(LOG_WARNING, "%s: cannot remove what was staged beside %s: %m", command, step->path);
 }
 
 int sync_links(CycleRun *run, const LinkRequest *links) {
@@ -238,7 +238,7 @@ int finish(CycleRun *run, ConfBuild *conf) {
 const CycleVariant &cycle_variant(CycleCommand command) { return VARIANTS[command]; }
 
 int cycle_abort(CycleRun *run) {
-    if (!run->committed) discard_staged(&run->changes);
+    if (!run->committed) discard_staged(&run->changes, command_of(run));
     log_failure(command_of(run), &run->failure,
                 run->committed ? "the change is stored, the rest is left to the next run; the server was not told"
                                : "nothing was changed");

@@ -83,11 +83,11 @@ int lock_node_file(const char *command, RunFailure *failure) {
     }
 }
 
-void unlock_node_file(int fd) {
+void unlock_node_file(int fd, const char *command) {
     if (fd == -1) return;
     // Unlinking while the lock is still held keeps the file and the lock in step
     // for the runs that wait on it.
-    if (unlink(NODE_LOCK_FILE) != 0) log_event(LOG_WARNING, "cannot remove %s: %m", NODE_LOCK_FILE);
+    if (unlink(NODE_LOCK_FILE) != 0) log_event(LOG_WARNING, "%s: cannot remove %s: %m", command, NODE_LOCK_FILE);
     set_whole_file_lock(fd, F_UNLCK);
     close(fd);
 }
@@ -103,7 +103,7 @@ void start_lock_wait_and_mark(const char *command) {
     if (fd != -1) close(fd);
 }
 
-void start_lock_clear() {
+void start_lock_clear(const char *command) {
     if (unlink(START_LOCK_FILE) != 0 && errno != ENOENT)
-        log_event(LOG_WARNING, "cannot remove %s: %m", START_LOCK_FILE);
+        log_event(LOG_WARNING, "%s: cannot remove %s: %m", command, START_LOCK_FILE);
 }

@@ -14,11 +14,11 @@
 [[nodiscard]] int lock_node_file(const char *command, RunFailure *failure);
 // Removes the lock file while still holding the lock, then unlocks and
 // closes. A descriptor of -1 (no lock held) does nothing.
-void unlock_node_file(int fd);
+void unlock_node_file(int fd, const char *command);
 // Sleeps two seconds when the start-lock file exists, then creates it or
 // updates its times. A mark that cannot be made only loses the delay; it is
 // told.
 void start_lock_wait_and_mark(const char *command);
-void start_lock_clear();
+void start_lock_clear(const char *command);
 
 #endif

@@ -97,7 +97,7 @@ int stage_on_volume(ListWrite *write, const char *volume_dir, bool iso, const Me
     char location[4096];
     char staged[4096];
     if (list_location(volume_dir, iso, location) != 0 || staged_path_of(location, staged, sizeof staged) != 0)
-        return note_failure(write->failure, "cannot locate the list of", volume_dir, ENOMEM);
+        return note_failure(write->failure, "cannot make room for the list of", volume_dir, ENOMEM);
     const StoredList *stored = find_stored_list(write->stored, location);
     if (stored != nullptr && stored->kept) {
         if (count == 0) return 0;
@@ -114,7 +114,7 @@ int stage_on_volume(ListWrite *write, const char *volume_dir, bool iso, const Me
     if (saveDataToHiddenByVolume(file, volume_dir) != 0)
         return note_failure(write->failure, "cannot stage", staged, errno);
     if (change_set_add(write->changes, CHANGE_REPLACE, location) != 0)
-        return note_failure(write->failure, "cannot record the change of", location, ENOMEM);
+        return note_failure(write->failure, "cannot make room for the change of", location, ENOMEM);
     return 0;
 }
 
@@ -148,7 +148,7 @@ void end_list_staging(ListWrite *write) {
     if (write->staging_dir[0] == '\0') return;
     int tmp_fd = open("/tmp", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (tmp_fd == -1 || remove_tree_at(tmp_fd, write->staging_dir + strlen("/tmp/")) != 0)
-        log_event(LOG_WARNING, "cannot remove %s: %m", write->staging_dir);
+        log_event(LOG_WARNING, "%s: cannot remove %s: %m", write->command, write->staging_dir);
     if (tmp_fd != -1) close(tmp_fd);
     write->staging_dir[0] = '\0';
 }
@@ -162,7 +162,7 @@ int discard_staged_lists(const PathNode *directories, RunFailure *failure) {
         for (bool iso : {false, true}) {  // the volume list, then the iso copy
             char location[4096];
             if (list_location(node->path, iso, location) != 0)
-                return note_failure(failure, "cannot locate the list of", node->path, ENOMEM);
+                return note_failure(failure, "cannot make room for the list of", node->path, ENOMEM);
             int staged = remove_staged(location);
             if (staged < 0) return note_failure(failure, "cannot remove what was staged beside", location, errno);
             removed += staged;

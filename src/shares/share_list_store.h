@@ -22,6 +22,7 @@ struct ListWrite {
     const VolumeEntry *volumes;  // where the iso list goes
     const StoredList *stored;    // as loaded
     ChangeSet *changes;
+    const char *command;         // as logged
     RunFailure *failure;
     char staging_dir[32];        // this run's folder in /tmp, "" until made
 };

@@ -33,7 +33,7 @@ LoadOutcome load_one(ListLoad *load, const char *volume_dir, bool iso, DavShareE
     StoredList *note = new_zeroed_record<StoredList>();
     if (note == nullptr || list_location(volume_dir, iso, note->location) != 0) {
         free(note);
-        note_failure(load->failure, "cannot locate the list of", volume_dir, ENOMEM);
+        note_failure(load->failure, "cannot make room for the list of", volume_dir, ENOMEM);
         return LIST_FAILED;
     }
     copy_text(note->volume_dir, volume_dir);

@@ -64,7 +64,7 @@ int stage_usb_mark(ChangeSet *changes, const char *folder, bool mark, const char
     } else if (mark && write_staged_marker(folder_fd) != 0) {
         result = note_failure(failure, "cannot stage the marker of", folder, errno);
     } else if (change_set_add(changes, mark ? CHANGE_MARK : CHANGE_UNMARK, marker) != 0) {
-        result = note_failure(failure, "cannot record the mark of", folder, ENOMEM);
+        result = note_failure(failure, "cannot make room for the change of", folder, ENOMEM);
     }
     close(folder_fd);
     return result;

@@ -19,7 +19,7 @@ int main(int argc, char **argv) {
             int marker = open("/tmp/lock_stress.inside", O_WRONLY | O_CREAT | O_EXCL, 0600);
             if (marker == -1) _exit(1);
             usleep(rand_r(&seed) % 200), close(marker), unlink("/tmp/lock_stress.inside");
-            unlock_node_file(lock);
+            unlock_node_file(lock, "stress");
             if (rand_r(&seed) % 4 == 0) usleep(rand_r(&seed) % 100);
         }
         _exit(0);
