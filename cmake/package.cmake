@@ -22,6 +22,7 @@ install(FILES ${PROJECT_SOURCE_DIR}/docs/copyright ${PROJECT_BINARY_DIR}/changel
 set(CPACK_PACKAGE_NAME davsync)
 set(CPACK_PACKAGE_VERSION ${DAVSYNC_VERSION})
 set(CPACK_PACKAGE_CONTACT "davsync developers <davsync@example.org>")
+set(CPACK_DEBIAN_PACKAGE_MAINTAINER "${CPACK_PACKAGE_CONTACT}")
 set(CPACK_PACKAGE_DESCRIPTION_SUMMARY
   "keeps a storage appliance's WebDAV server in step with its shares")
 set(CPACK_PACKAGE_DESCRIPTION
