@@ -8,15 +8,12 @@
 #include "base/name_index.h"
 #include "base/safe_file.h"
 #include "output/link_dir.h"
-#include "shares/path_list.h"
 
 struct ConfBuild {
     MemoryFile conf;
     MemoryFile note;
     bool note_wanted;     // false: the note file is removed
-    PathNode *published;  // shared names that have a section already
-    PathNode *published_tail;
-    NameIndex published_names;  // over the texts of `published`
+    NameIndex published;  // shared names that have a section already (borrowed)
     LinkRequest *links;
     GroupTable groups;
     bool failed;          // memory ran out on the way
@@ -24,8 +21,9 @@ struct ConfBuild {
 
 // 0, or -1 when memory runs out (the build is then freed).
 [[nodiscard]] int conf_build_open(ConfBuild *build);
-// Registers a shared name for a section: 0 when it was not published yet,
-// -1 when it was (or does not fit a path list node, or memory runs out).
+// Registers a shared name for a section, so that no name gets two: 0 when
+// it was not published yet, -1 when it was (or memory ran out). The name is
+// borrowed: it must stay as it is while the build lives.
 int publish_name(ConfBuild *build, const char *shared_name);
 // Ends the texts: 0 when everything came out whole, -1 when memory ran out.
 [[nodiscard]] int conf_build_close(ConfBuild *build);
