@@ -1,5 +1,14 @@
-// Allocation and release shared by every record type kept in a singly
-// linked list through its `next` field.
+// The one way lists are kept. A list is a chain of records through their
+// `next` field, held by a pointer to its first record (null for none).
+// Where a caller makes the first record itself and hands it to a filler
+// (the entry list, the catalogue, the volume table), that record is simply
+// the first one; a record whose key text is empty (an emptied entry, the
+// empty first node of a path list, the open slot of a name list) is a record
+// like any other that every walker passes over. Records are added at the
+// tail (or the head, where order does not matter) and freed with
+// free_record_list, or with the list's own free function when a record owns
+// more. Arrays with a count (a sorted index, the names of
+// one expansion) are indexes over data, never lists.
 #ifndef DAVSYNC_BASE_RECORD_LIST_H
 #define DAVSYNC_BASE_RECORD_LIST_H
 
