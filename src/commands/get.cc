@@ -64,15 +64,12 @@ static int answer_from_lists(RunFailure *failure, const char *query_path, const 
             return note_failure(failure, "cannot remove", QUERY_FILE, errno);
         return 0;
     }
-    for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next) {
-        if (entry->path[0] == '\0' || strcmp(entry->path, query_path) != 0) continue;
-        if (!copy_escaped(entry->shared_name, found->shared_name, sizeof found->shared_name) ||
-            !copy_escaped(entry->path, found->path, sizeof found->path))
-            return 0;
-        found->enable = entry->enable;
-        return answer(failure, found);
-    }
-    return 0;
+    const DavShareEntry *entry = find_entry_by_path(entries, query_path);
+    if (entry == nullptr || !copy_escaped(entry->shared_name, found->shared_name, sizeof found->shared_name) ||
+        !copy_escaped(entry->path, found->path, sizeof found->path))
+        return 0;
+    found->enable = entry->enable;
+    return answer(failure, found);
 }
 
 static int answer_volume_folder(RunFailure *failure, const char *query_path, DavShareEntry *found) {

@@ -8,9 +8,9 @@ DavShareEntry *new_dav_share_entry() { return new_zeroed_record<DavShareEntry>()
 
 void free_dav_share_list(DavShareEntry *head) { free_record_list(head); }
 
-DavShareEntry *find_entry_by_path(DavShareEntry *entries, const char *path) {
-    for (DavShareEntry *entry = entries; entry != nullptr; entry = entry->next)
-        if (entry->path[0] != '\0' && strcmp(entry->path, path) == 0) return entry;
+DavShareEntry *find_entry_by_path(const DavShareEntry *entries, const char *path) {
+    for (const DavShareEntry *entry = entries; entry != nullptr; entry = entry->next)
+        if (entry->path[0] != '\0' && strcmp(entry->path, path) == 0) return const_cast<DavShareEntry *>(entry);
     return nullptr;
 }
 

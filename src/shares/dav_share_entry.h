@@ -19,7 +19,7 @@ struct DavShareEntry {
 [[nodiscard]] DavShareEntry *new_dav_share_entry();
 void free_dav_share_list(DavShareEntry *head);
 // The first entry whose path is exactly `path` (never an empty one), or null.
-DavShareEntry *find_entry_by_path(DavShareEntry *entries, const char *path);
+DavShareEntry *find_entry_by_path(const DavShareEntry *entries, const char *path);
 // Empties an entry in place: it stays in the list and publishes nothing.
 void empty_entry(DavShareEntry *entry);
 // The last entry of the list.
