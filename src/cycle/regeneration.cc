@@ -269,7 +269,9 @@ int cycle_finish(CycleRun *run) {
     conf_build_free(&conf);
     if (result != 0) return cycle_abort(run);
     release_marks(run);
-    run_shell_command(run->webdav_enable == 1 ? "apache restart dav" : "apache stop dav");
+    const char *server_command = run->webdav_enable == 1 ? "apache restart dav" : "apache stop dav";
+    if (run_shell_command(server_command) != 0)
+        log_event(LOG_ERR, "%s: cannot run %s: %m", command_of(run), server_command);
     free_run_objects(run);
     return 0;
 }
