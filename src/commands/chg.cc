@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <cstring>
+#include <syslog.h>
 
 #include "base/appliance_paths.h"
 #include "base/file_read.h"
@@ -26,8 +27,10 @@ int webdav_chg(const char *old_argument, const char *new_argument) {
     char old_path[DAV_TEXT_WIDTH];
     char new_path[DAV_TEXT_WIDTH];
     // No entry path is that long, and a cut new path would point elsewhere.
-    if (copy_text(old_path, old_argument) != 0 || copy_text(new_path, new_argument) != 0)
+    if (copy_text(old_path, old_argument) != 0 || copy_text(new_path, new_argument) != 0) {
+        log_event(LOG_WARNING, "chg: refused a path longer than %d bytes", DAV_TEXT_WIDTH - 1);
         return -1;
+    }
     CycleRun run;
     if (cycle_begin(&run, CYCLE_CHG) < 0) return -1;
     if (move_entries(&run, old_path, new_path) != 0) return cycle_abort(&run);
