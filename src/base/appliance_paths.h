@@ -6,6 +6,7 @@
 #include <cstddef>
 
 constexpr const char *LINK_DIR = "/usr/local/apache2_dav/webdav";
+constexpr const char *CONF_DIR = "/usr/local/apache2_dav/conf/extra";
 constexpr const char *PLACED_CONF_FILE = "/usr/local/apache2_dav/conf/extra/httpd-dav.conf";
 constexpr const char *NOTE_FILE = "/tmp/set_webdav_note";
 constexpr const char *QUERY_FILE = "/tmp/webdav_query.xml";

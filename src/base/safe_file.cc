@@ -171,7 +171,7 @@ static bool is_temporary_name(const char *name, const char *prefix) {
     return strncmp(name, prefix, length) == 0 && strlen(name) == length + 6;
 }
 
-// Whether nobody holds the file `name`: a live writer keeps a flock on it.
+// Whether nobody holds `name`: a live writer keeps a flock on its file.
 static bool is_abandoned(int dir_fd, const char *name) {
     int fd = openat(dir_fd, name, O_RDONLY | NO_SURPRISES);
     if (fd == -1) return false;
@@ -180,9 +180,7 @@ static bool is_abandoned(int dir_fd, const char *name) {
     return free;
 }
 
-// Calls `remove` for this user's entries of `dir` that one of `prefixes`
-// names (a temporary's name: the prefix and six characters).
-static int sweep(const char *dir, const char *const *prefixes, int prefix_count, bool check_lock) {
+int remove_stale_temporaries(const char *dir, const char *const *prefixes, int count) {
     DIR *listing = opendir(dir);
     if (listing == nullptr) return errno == ENOENT || errno == ENOTDIR ? 0 : -1;
     int dir_fd = dirfd(listing);
@@ -192,11 +190,11 @@ static int sweep(const char *dir, const char *const *prefixes, int prefix_count,
         const struct dirent *entry = readdir(listing);
         if (entry == nullptr) break;
         bool named = false;
-        for (int i = 0; i < prefix_count && !named; ++i) named = is_temporary_name(entry->d_name, prefixes[i]);
+        for (int i = 0; i < count && !named; ++i) named = is_temporary_name(entry->d_name, prefixes[i]);
         struct stat status;
         if (!named || fstatat(dir_fd, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0 ||
             status.st_uid != geteuid() || !(S_ISDIR(status.st_mode) || S_ISREG(status.st_mode)) ||
-            (check_lock && !is_abandoned(dir_fd, entry->d_name)))
+            !is_abandoned(dir_fd, entry->d_name))
             continue;
         if (remove_tree_at(dir_fd, entry->d_name) == 0) ++removed;
     }
@@ -204,23 +202,6 @@ static int sweep(const char *dir, const char *const *prefixes, int prefix_count,
     closedir(listing);
     errno = error;
     return error != 0 ? -1 : removed;
-}
-
-int remove_stale_temporaries(const char *dir, const char *const *prefixes, int count) {
-    return sweep(dir, prefixes, count, false);
-}
-
-int remove_stale_replacements(const char *path) {
-    char dir[4096];
-    const char *name;
-    char hidden[300];
-    char plain[300];
-    if (folder_of(path, dir, &name) != 0 ||
-        format_text_field(hidden, sizeof hidden, ".%s.", name) != 0 ||
-        format_text_field(plain, sizeof plain, "%s.", name) != 0)
-        return 0;
-    const char *const prefixes[] = {hidden, plain};
-    return sweep(dir, prefixes, 2, true);
 }
 
 int remove_tree_at(int dir_fd, const char *name) {

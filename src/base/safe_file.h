@@ -35,18 +35,14 @@ int sync_dir(int dir_fd);
 // unnamed file in the same folder (synced unless below /tmp), which gets a
 // hidden name ".<name>.XXXXXX" only once complete and is renamed over `path`
 // at once. It stays under flock(LOCK_EX) while it has that name, so that
-// remove_stale_replacements never takes a live one. -1 (errno) when any step
+// remove_stale_temporaries never takes a live one. -1 (errno) when any step
 // fails; the old file is then untouched.
 [[nodiscard]] int replace_file(const char *path, const char *data, size_t length, mode_t mode);
-// Removes what a killed writer left of replace_file's hidden names beside
-// `path`, and what older versions left at "<name>.XXXXXX" there: this
-// user's regular files that nobody holds a flock on. Returns how many it
-// removed, -1 (errno) when the folder could not be read.
-int remove_stale_replacements(const char *path);
-// Removes this user's entries of `dir` named by one of `prefixes` and six
-// more characters: files, and folders with the files in them. Only for
-// callers that hold the node lock. Returns how many it removed, -1 (errno)
-// when the folder could not be read (a missing one has none).
+// Removes what killed writers left in `dir`: this user's entries named by
+// one of `prefixes` and six more characters (replace_file's hidden names,
+// staging folders with the files in them) that nobody holds a flock on.
+// Only for callers that hold the node lock. Returns how many it removed, -1
+// (errno) when the folder could not be read (a missing one has none).
 int remove_stale_temporaries(const char *dir, const char *const *prefixes, int count);
 
 // An O_PATH descriptor of the directory `path`, resolved component by

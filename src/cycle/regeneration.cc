@@ -84,20 +84,20 @@ int discard_leftovers(CycleRun *run) {
     int marks = discard_staged_marks(&run->failure);
     if (marks < 0) return -1;
     lists += marks;
-    static const char *const STAGING[] = {"davsync."};
-    const char *const REPLACED[] = {PLACED_CONF_FILE, NOTE_FILE, QUERY_FILE};
+    // Staging folders, and unfinished replacements of the note and the answer.
+    static const char *const IN_TMP[] = {"davsync.", ".set_webdav_note.", ".webdav_query.xml."};
+    // What older versions left beside the configuration.
+    static const char *const BESIDE_CONF[] = {".httpd-dav.conf."};
     int removed = lists;
     int found = remove_staged(PLACED_CONF_FILE);
     if (found < 0) return note_failure(&run->failure, "cannot remove what was staged beside", PLACED_CONF_FILE, errno);
     removed += found;
-    found = remove_stale_temporaries("/tmp", STAGING, 1);
+    found = remove_stale_temporaries("/tmp", IN_TMP, 3);
     if (found < 0) return note_failure(&run->failure, "cannot clear", "/tmp", errno);
     removed += found;
-    for (const char *path : REPLACED) {
-        found = remove_stale_replacements(path);
-        if (found < 0) return note_failure(&run->failure, "cannot clear", path, errno);
-        removed += found;
-    }
+    found = remove_stale_temporaries(CONF_DIR, BESIDE_CONF, 1);
+    if (found < 0) return note_failure(&run->failure, "cannot clear", CONF_DIR, errno);
+    removed += found;
     if (removed > 0)
         log_event(LOG_NOTICE, "%s: discarded what an interrupted run left (%d files)", command_of(run), removed);
     return 0;
