@@ -248,6 +248,10 @@ int open_dir_no_links(const char *path) {
     return dir_fd;
 }
 
+bool is_not_reachable(int error) {
+    return error == ENOENT || error == ENOTDIR || error == ELOOP || error == EINVAL;
+}
+
 int memory_file_open(MemoryFile *file) {
     file->text = nullptr;
     file->length = 0;

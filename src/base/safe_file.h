@@ -47,8 +47,11 @@ int remove_stale_temporaries(const char *dir, const char *const *prefixes, int c
 
 // An O_PATH descriptor of the directory `path`, resolved component by
 // component without following any link; "." and ".." are refused. -1
-// (errno; ELOOP for a link on the way) on failure.
+// (errno; ELOOP for a link on the way, EINVAL for a dot name) on failure.
 [[nodiscard]] int open_dir_no_links(const char *path);
+// Whether open_dir_no_links failed for what stands on the way (nothing
+// there, no folder, a link, a dot name) rather than for the system.
+bool is_not_reachable(int error);
 // Removes whatever is at `name` in `dir_fd`: a folder with everything in it,
 // never following a link inside. 0, or -1 (errno).
 int remove_tree_at(int dir_fd, const char *name);

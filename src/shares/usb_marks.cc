@@ -42,6 +42,20 @@ int write_staged_marker(int folder_fd) {
     return -1;
 }
 
+// 1 when a staged marker was removed from the folder, 0 when there was none
+// (or the folder cannot be reached), -1 (errno) when that could not be told
+// or done.
+int discard_in_folder(const char *folder) {
+    int folder_fd = open_dir_no_links(folder);
+    if (folder_fd == -1) return is_not_reachable(errno) ? 0 : -1;
+    int kind = marker_kind(folder_fd, STAGED_MARKER);
+    int result = kind == 1 ? (unlinkat(folder_fd, STAGED_MARKER, 0) == 0 ? 1 : -1) : kind < 0 ? -1 : 0;
+    int error = errno;
+    close(folder_fd);
+    errno = error;
+    return result;
+}
+
 }  // namespace
 
 int stage_usb_mark(ChangeSet *changes, const char *folder, bool mark, const char *command,
@@ -50,8 +64,8 @@ int stage_usb_mark(ChangeSet *changes, const char *folder, bool mark, const char
     if (usb_marker_path(folder, marker, sizeof marker) != 0) return 0;
     int folder_fd = open_dir_no_links(folder);
     if (folder_fd == -1) {
+        if (!is_not_reachable(errno)) return note_failure(failure, "cannot open the folder", folder, errno);
         if (errno == ELOOP || errno == EINVAL) refuse(command, folder, "a link or a dot name on the way");
-        else if (errno != ENOENT && errno != ENOTDIR) return note_failure(failure, "cannot open the folder", folder, errno);
         return 0;
     }
     int kind = marker_kind(folder_fd, USB_MARKER);
@@ -72,21 +86,22 @@ int stage_usb_mark(ChangeSet *changes, const char *folder, bool mark, const char
 
 int discard_staged_marks(RunFailure *failure) {
     DIR *listing = opendir(USB_DIR);
-    if (listing == nullptr) return errno == ENOENT || errno == ENOTDIR ? 0 : note_failure(failure, "cannot read the folder", USB_DIR, errno);
+    if (listing == nullptr)
+        return errno == ENOENT || errno == ENOTDIR ? 0 : note_failure(failure, "cannot read the folder", USB_DIR, errno);
     int removed = 0;
+    int found = 0;
     for (;;) {
         errno = 0;
         const struct dirent *entry = readdir(listing);
         if (entry == nullptr) break;
-        if (entry->d_name[0] == '.') continue;
         char folder[4096];
-        if (format_text_field(folder, sizeof folder, "%s/%s", USB_DIR, entry->d_name) != 0) continue;
-        int folder_fd = open_dir_no_links(folder);
-        if (folder_fd == -1) continue;
-        if (marker_kind(folder_fd, STAGED_MARKER) == 1 && unlinkat(folder_fd, STAGED_MARKER, 0) == 0) ++removed;
-        close(folder_fd);
+        if (entry->d_name[0] == '.' || format_text_field(folder, sizeof folder, "%s/%s", USB_DIR, entry->d_name) != 0)
+            continue;
+        found = discard_in_folder(folder);
+        if (found < 0) break;
+        removed += found;
     }
     int error = errno;
     closedir(listing);
-    return error == 0 ? removed : note_failure(failure, "cannot read the folder", USB_DIR, error);
+    return error == 0 && found >= 0 ? removed : note_failure(failure, "cannot clear", USB_DIR, error);
 }

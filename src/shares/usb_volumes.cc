@@ -82,7 +82,11 @@ int read_rules(UsbRead *read, int volume_fd, UsbVolume *volume) {
 
 int read_volume(UsbRead *read, const char *path) {
     int volume_fd = open_dir_no_links(path);
-    if (volume_fd == -1) return 0;  // not reached without a link: not used
+    if (volume_fd == -1) {
+        // Gone, or reached only through a link: not used.
+        if (is_not_reachable(errno)) return 0;
+        return note_failure(read->failure, "cannot open the folder", path, errno);
+    }
     int marked = is_marked(read, volume_fd, path);
     int result = marked < 0 ? -1 : 0;
     if (marked == 1) {
