@@ -9,6 +9,7 @@
 #include <dlfcn.h>
 #include <errno.h>
 #include <fcntl.h>
+#include <mntent.h>
 #include <signal.h>
 #include <stdarg.h>
 #include <stdio.h>
@@ -111,6 +112,16 @@ FAILS(int, fchmod, (int fd, mode_t mode), (fd, mode), -1)
 FAILS(int, chmod, (const char *path, mode_t mode), (path, mode), -1)
 FAILS(ssize_t, readlink, (const char *path, char *buffer, size_t size), (path, buffer, size), -1)
 FAILS(ssize_t, readlinkat, (int dir, const char *path, char *buffer, size_t size), (dir, path, buffer, size), -1)
+
+// Stdio and the mount table read through libc's own read: a failed read
+// ends the stream with its error flag set, as a real one does.
+#define STREAM_READ(ret, name, params, args, file) \
+    ret name params { REAL(name); if (strikes(#name)) { (file)->_flags |= _IO_ERR_SEEN; return NULL; } return real args; }
+STREAM_READ(char *, fgets, (char *line, int size, FILE *file), (line, size, file), file)
+STREAM_READ(struct mntent *, getmntent, (FILE *file), (file), file)
+FAILS(FILE *, setmntent, (const char *path, const char *mode), (path, mode), NULL)
+FAILS(struct dirent *, readdir, (DIR *folder), (folder), NULL)
+FAILS(struct dirent64 *, readdir64, (DIR *folder), (folder), NULL)
 
 // Only the lock commands count.
 #define FCNTL(name) int name(int fd, int command, ...) { \
