@@ -65,12 +65,16 @@ const std::vector<Command> COMMANDS = {
 const std::vector<std::pair<std::string, int>> MODES = {{"ENOSPC", ENOSPC}, {"EIO", EIO}, {"EACCES", EACCES}, {"kill", 0}};
 
 // What a run leaves: the files that must be old or new, the link directory,
-// what the outcome also counts, and the tree of names and types.
+// what the outcome also counts, and every entry: its type, mode and content.
 struct State {
-    std::map<std::string, std::string> kept, links;
+    std::map<std::string, std::string> kept, links, entries;
     std::string note, calls;
-    std::set<std::string> tree;
     bool operator==(const State &o) const { return kept == o.kept && links == o.links; }
+    std::set<std::string> tree() const {  // names and types
+        std::set<std::string> names;
+        for (const auto &[path, entry] : entries) names.insert(path + " " + entry[0]);
+        return names;
+    }
 };
 
 State snapshot(const Appliance &box) {
@@ -80,8 +84,10 @@ State snapshot(const Appliance &box) {
             std::string path = top + it->path().string().substr(box.host(top).size());
             std::string name = it->path().filename(), folder = it->path().parent_path().filename();
             if (path == "/proc") it.disable_recursion_pending();
-            if (path == "/dev/log" || path == "/var/log/apache_calls") continue;
-            state.tree.insert(path + " " + "-fdlbcpsu"[int(it->symlink_status().type()) & 7]);
+            if (path == "/dev/log" || path == "/var/log/apache_calls" || path == "/opt/preload") continue;
+            auto status = it->symlink_status();
+            state.entries[path] = "-fdlbcpsu"[int(status.type()) & 7] + std::to_string(int(status.permissions())) + " " +
+                                  (fs::is_regular_file(status) ? box.read(path) : box.link_target(path));
             if (((name == "lighty.xml" || name == ISO) && folder == ".system_data") || name == ".davconf" || path == CONF ||
                 path == QUERY)
                 state.kept[path] = box.read(path);
@@ -147,8 +153,9 @@ struct Runner {
         run(command.words, std::to_string(k) + ":" + (mode.second ? std::to_string(mode.second) : "kill"));
         State left = snapshot(*work);
         bool told = work->log_lines().size() > logged;
-        run({"start"}, "");
-        State then = snapshot(*work);
+        // A root exactly as before or as the fault-free run left it starts as the references did.
+        State then = left.entries == before.entries ? start_alone : left.entries == after.entries ? after_start
+                     : (run({"start"}, ""), snapshot(*work));
         std::string wrong;
         bool all_new = true;
         std::set<std::string> paths;
@@ -163,10 +170,11 @@ struct Runner {
             wrong += " configuration new, a list or marker not;";
         if (!(then == after_start) && !(then == start_alone)) wrong += " the next start left neither outcome;";
         const State &like = then == start_alone ? start_alone : after_start;
-        for (const std::string &entry : then.tree)
-            if (!like.tree.count(entry)) wrong += " left " + entry + ";";
-        for (const std::string &entry : like.tree)
-            if (!then.tree.count(entry)) wrong += " lost " + entry + ";";
+        std::set<std::string> now = then.tree(), want = like.tree();
+        for (const std::string &entry : now)
+            if (!want.count(entry)) wrong += " left " + entry + ";";
+        for (const std::string &entry : want)
+            if (!now.count(entry)) wrong += " lost " + entry + ";";
         bool changed = mode.second && (left.kept != after.kept || left.note != after.note || left.calls != after.calls);
         return std::string(wrong.empty() ? "0" : "1") + (changed ? " 1" : " 0") + (changed && told ? " 1" : " 0") + wrong;
     }
