@@ -29,18 +29,9 @@ struct Command {
     bool started = true;  // a start placed the configuration and links first
 };
 
-Share open_share(const std::string &path) { return {path.substr(path.rfind('/') + 1), path, "", "", "", "yes"}; }
-auto more_shares(const std::vector<Share> &more) {
-    return [=](Appliance &box) {
-        std::vector<Share> shares = realistic_shares();
-        shares.insert(shares.end(), more.begin(), more.end());
-        publish(box, shares);
-        box.mount_usb("USB2", false);
-        box.write("/tmp/input.xml", share_list_xml(1, {{"NewA", A2 + "/NewA"}, {"NewB", B2 + "/NewB"},
-                                                       {"Music", A2 + "/Music", 1, 1}, {"usb", "/mnt/USB/USB2"}}));
-    };
-}
-const auto DO_SETUP = more_shares({open_share(A2 + "/NewA"), open_share(B2 + "/NewB")});
+const auto DO_SETUP = with({open_share(A2 + "/NewA"), open_share(B2 + "/NewB")},
+                          {{"NewA", A2 + "/NewA"}, {"NewB", B2 + "/NewB"}, {"Music", A2 + "/Music", 1, 1}, {"usb", "/mnt/USB/USB2"}},
+                          [](Appliance &box) { box.mount_usb("USB2", false); });
 
 const std::vector<Command> COMMANDS = {
     {"start", {"start"}, nullptr, false},
@@ -53,7 +44,7 @@ const std::vector<Command> COMMANDS = {
          shares[0].read_list = "#bob#";
          box.set_catalogue(shares);
      }},
-    {"chg", {"chg", A2 + "/Music", B2 + "/Media/Music"}, more_shares({open_share(B2 + "/Media/Music")})},
+    {"chg", {"chg", A2 + "/Music", B2 + "/Media/Music"}, with({open_share(B2 + "/Media/Music")})},
     {"p2pen", {"p2pen"}, [](Appliance &box) {
          publish(box, [] { auto shares = realistic_shares(); shares.push_back({"P2P", B2 + "/P2P"}); return shares; }());
          box.set_config("/download_mgr/p2p/enable", "1");
