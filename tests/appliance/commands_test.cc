@@ -18,19 +18,6 @@ Files untouched_but(const Files &changed) {
     return files;
 }
 
-// More shares (and their folders), a do/merge input file, then anything else.
-auto with(const std::vector<Share> &more, const std::vector<ListItem> &input = {},
-          std::function<void(Appliance &)> then = nullptr) {
-    return [=](Appliance &box) {
-        std::vector<Share> shares = realistic_shares();
-        shares.insert(shares.end(), more.begin(), more.end());
-        publish(box, shares);
-        box.write("/tmp/input.xml", share_list_xml(1, input));
-        if (then) then(box);
-    };
-}
-Share open_share(const std::string &path) { return {path.substr(path.rfind('/') + 1), path, "", "", "", "yes"}; }
-
 const Words DO = {"do", "/tmp/input.xml"};
 const auto WHOLE_VOLUME = with({{"Whole", A2 + "/", "", "", "", "yes"}}, {}, [](Appliance &box) {
     box.write_list(A2, {{"Public", "/Public"}, {"Music", "/Music", 0, 1}, {"Whole", "/"}}, 7);

@@ -83,6 +83,19 @@ inline void realistic(Appliance &box) {
     box.write("/etc/shared_name", "usbdisk1 = USB1\n");
 }
 
+// A set-up: more shares (and their folders), a do/merge input file, then anything else.
+inline auto with(const std::vector<Share> &more, const std::vector<ListItem> &input = {},
+                 std::function<void(Appliance &)> then = nullptr) {
+    return [=](Appliance &box) {
+        std::vector<Share> shares = realistic_shares();
+        shares.insert(shares.end(), more.begin(), more.end());
+        publish(box, shares);
+        box.write("/tmp/input.xml", share_list_xml(1, input));
+        if (then) then(box);
+    };
+}
+inline Share open_share(const std::string &path) { return {path.substr(path.rfind('/') + 1), path, "", "", "", "yes"}; }
+
 // What is at `path`, in the form `want` takes: the exact content; "-> T", a
 // link to T; "mode 755", the permission bits; for a path ending in '/', the
 // names in that folder joined by spaces; GONE, nothing.
