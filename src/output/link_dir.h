@@ -31,10 +31,10 @@ int check_link_dir();
 // cannot be used.
 [[nodiscard]] int open_link_dir();
 // Brings the open directory in line with `wanted`: every entry that is not a
-// folder and not a wanted link that already points where it is wanted goes
-// (names that start with a dot too); each wanted link is made, replacing in
-// one rename what else stands at its name, so a share never lacks its link
-// while it is re-pointed. A folder at a wanted name stays and is told.
+// folder and has no wanted name goes (names that start with a dot too); each
+// wanted link is made unless it already points where it is wanted,
+// replacing in one rename what else stands at its name, so a share never
+// lacks its link while it is re-pointed. A folder at a wanted name stays and is told.
 // Nothing outside the directory is written. 0, or -1 with the failure noted.
 int sync_link_dir(int dir_fd, const LinkRequest *wanted, const char *command, RunFailure *failure);
 

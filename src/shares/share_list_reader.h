@@ -8,8 +8,10 @@
 // parent folder). A new entry is started only once the current one has a
 // shared name.
 //
-// The text is read as UTF-8 whatever it declares, up to its first NUL byte,
-// by libxml2's SAX interface: no tree is built, however long the list.
+// The text is read as UTF-8 whatever it declares, up to its first NUL byte:
+// in the tool's own layout by its scanner (share_list_layout.h), any other
+// text by libxml2's SAX interface. Both feed the same rules (list_builder.h);
+// no tree is built, however long the list.
 #ifndef DAVSYNC_SHARES_SHARE_LIST_READER_H
 #define DAVSYNC_SHARES_SHARE_LIST_READER_H
 
