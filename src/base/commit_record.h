@@ -6,7 +6,8 @@
 // record. A run killed before the record exists leaves only staged files,
 // which the next run discards; one killed after it leaves the record, which
 // the next run rolls forward: every step is idempotent (a staged file that is
-// gone was renamed already; a marker removed already is not there). Only runs that hold the node lock may call these.
+// gone was renamed already; a marker removed already is not there). Only runs
+// that hold the node lock may call these.
 #ifndef DAVSYNC_BASE_COMMIT_RECORD_H
 #define DAVSYNC_BASE_COMMIT_RECORD_H
 

@@ -49,7 +49,7 @@ static char *mount_dir_of(const char *line, const char *end, bool *failed) {
     return dir;
 }
 
-int parse_mount_table(const char *text, MountPoint **table_out) {
+static int parse_mount_table(const char *text, MountPoint **table_out) {
     *table_out = nullptr;
     MountPoint **tail = table_out;
     bool failed = false;

@@ -16,8 +16,6 @@ struct MountPoint {
 // The table's mount directories, or null for a table with none (and when
 // there is no table). 0, or -1 with errno set when it could not be read.
 int read_mount_table(MountPoint **table_out);
-// The same from a text (for a caller that read the file itself).
-int parse_mount_table(const char *text, MountPoint **table_out);
 // Whether `dir` is exactly one of the table's mount directories.
 bool is_mount_dir(const MountPoint *table, const char *dir);
 void free_mount_table(MountPoint *table);

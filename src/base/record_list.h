@@ -7,8 +7,8 @@
 // like any other that every walker passes over. Records are added at the
 // tail (or the head, where order does not matter) and freed with
 // free_record_list, or with the list's own free function when a record owns
-// more. Arrays with a count (a sorted index, the names of
-// one expansion) are indexes over data, never lists.
+// more. Arrays with a count (a sorted index, the names of one expansion) are
+// indexes over data, never lists.
 #ifndef DAVSYNC_BASE_RECORD_LIST_H
 #define DAVSYNC_BASE_RECORD_LIST_H
 

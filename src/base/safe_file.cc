@@ -44,12 +44,6 @@ static int close_keeping(int fd, int result) {
     return result;
 }
 
-int touch_own_file(const char *path) {
-    int fd = open_own_regular(path, O_WRONLY | O_CREAT, 0644);
-    if (fd == -1) return -1;
-    return close_keeping(fd, futimens(fd, nullptr));
-}
-
 int write_all(int fd, const void *data, size_t length) {
     const char *at = static_cast<const char *>(data);
     while (length > 0) {

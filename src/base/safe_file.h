@@ -16,8 +16,6 @@
 [[nodiscard]] int open_own_regular(const char *path, int flags, mode_t mode);
 // Same, relative to the directory `dir_fd`.
 [[nodiscard]] int open_own_regular_at(int dir_fd, const char *name, int flags, mode_t mode);
-// Creates the file or updates its times, like touch(1), with the checks above.
-int touch_own_file(const char *path);
 
 // Writes all `length` bytes, resuming after short writes. 0, or -1 (errno).
 int write_all(int fd, const void *data, size_t length);

@@ -76,7 +76,7 @@ static char *new_record(xmlNode *item) {
     return record;
 }
 
-int apkg_read_list_file(const char *file) {
+static int apkg_read_list_file(const char *file) {
     APKG_FreeAllXml();
     char *header = static_cast<char *>(calloc(1, APKG_HEADER_SIZE));
     if (header == nullptr) return -1;

@@ -32,7 +32,4 @@ int APKG_ReadAllXml(void);
 void APKG_FreeAllXml(void);
 }
 
-// APKG_ReadAllXml on another file (it uses the fixed one).
-int apkg_read_list_file(const char *file);
-
 #endif

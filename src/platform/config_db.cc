@@ -129,7 +129,7 @@ xmlChar *lookup_value(const char *file, const char *slash_path) {
 
 }  // namespace
 
-int xml_get_str_in(const char *file, const char *path, int size, char *buf) {
+static int xml_get_str_in(const char *file, const char *path, int size, char *buf) {
     if (path == nullptr || buf == nullptr || size <= 0) return errno = EINVAL, -1;
     xmlChar *value = lookup_value(file, path);
     if (value == nullptr) return -1;
@@ -140,7 +140,7 @@ int xml_get_str_in(const char *file, const char *path, int size, char *buf) {
     return 0;
 }
 
-int xml_get_int_in(const char *file, const char *path) {
+static int xml_get_int_in(const char *file, const char *path) {
     if (path == nullptr) return errno = EINVAL, -1;
     xmlChar *value = lookup_value(file, path);
     if (value == nullptr) return -1;

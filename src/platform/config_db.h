@@ -18,8 +18,4 @@ int xml_get_str(const char *path, int size, char *buf);
 int xml_get_int(const char *path);
 }
 
-// The same lookups in another file (the functions above use the fixed one).
-int xml_get_str_in(const char *file, const char *path, int size, char *buf);
-int xml_get_int_in(const char *file, const char *path);
-
 #endif

@@ -65,12 +65,6 @@ extern "C" void free_xml_memory(xmlDoc *doc) {
     xmlMemoryDump();
 }
 
-char *copy_node_text_if_named(xmlNode *node, const xmlChar *name, char *buffer, size_t size) {
-    if (node == nullptr || xmlStrcmp(node->name, name) != 0) return nullptr;
-    copy_node_content(node, buffer, size);
-    return buffer;
-}
-
 static void ignore_xml_error(void *, const char *, ...) {}
 
 void quiet_xml_errors() {

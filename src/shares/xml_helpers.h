@@ -40,9 +40,5 @@ int escape_xml_text(const char *text, char *out);
 // usage text, and a reader's result already tells a broken file.
 void quiet_xml_errors();
 
-// When node's name equals `name`: copies its text content into `buffer`
-// (cut to `size`-1 characters) and returns buffer; otherwise null, buffer
-// untouched.
-char *copy_node_text_if_named(xmlNode *node, const xmlChar *name, char *buffer, size_t size);
 
 #endif
