@@ -59,6 +59,8 @@ appliance_new() {
         "$root$appliance_server_root"/{conf/extra,var,logs,htdocs}
     chmod 1777 "$root/tmp"
     : >"$root/dev/null"
+    : >"$root/dev/zero"
+    ln -s /proc/self/fd "$root/dev/fd"
     : >"$root/etc/mtab"
     printf 'root:x:0:0:root:/root:/bin/sh\nwww-data:x:%s:%s:www-data:/var/www:/usr/sbin/nologin\n' \
         "$appliance_www_id" "$appliance_www_id" >"$root/etc/passwd"
@@ -77,9 +79,12 @@ appliance_new() {
     echo "$root"
 }
 
-# The server's main configuration, listening on 127.0.0.1:PORT.
+# The server's main configuration, listening on 127.0.0.1:PORT, with its
+# status page on another loopback port.
 appliance_main_conf() {
-    sed "s/@LISTEN@/127.0.0.1:$1/" "$appliance_repo/appliance/httpd.conf"
+    local status
+    until status=$(free_port) && ((status != $1)); do :; done
+    sed -e "s/@LISTEN@/127.0.0.1:$1/" -e "s/@STATUS_PORT@/$status/" "$appliance_repo/appliance/httpd.conf"
 }
 
 # appliance_switch ROOT 0|1: the WebDAV switch in the configuration database.
@@ -177,6 +182,7 @@ appliance_run() {
         done
         mount --rbind /proc "$root/proc"
         mount --bind /dev/null "$root/dev/null"
+        mount --bind /dev/zero "$root/dev/zero"
         exec chroot "$root" /usr/bin/env -i PATH="'"$appliance_path"'" "$@"
     ' appliance "$root" "$@"
 }
