@@ -79,12 +79,9 @@ appliance_new() {
     echo "$root"
 }
 
-# The server's main configuration, listening on 127.0.0.1:PORT, with its
-# status page on another loopback port.
+# The server's main configuration, listening on 127.0.0.1:PORT.
 appliance_main_conf() {
-    local status
-    until status=$(free_port) && ((status != $1)); do :; done
-    sed -e "s/@LISTEN@/127.0.0.1:$1/" -e "s/@STATUS_PORT@/$status/" "$appliance_repo/appliance/httpd.conf"
+    sed "s/@LISTEN@/127.0.0.1:$1/" "$appliance_repo/appliance/httpd.conf"
 }
 
 # appliance_switch ROOT 0|1: the WebDAV switch in the configuration database.
@@ -153,6 +150,7 @@ appliance_catalogue_add() {
     local items
     items=$(catalogue_items "$1")
     items=${items//\\/\\\\}
+    items=${items//&/\\&}
     sed -i "s|</samba></config>|${items//|/\\|}&|" "$1/var/www/xml/smb.xml"
 }
 
