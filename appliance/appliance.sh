@@ -59,6 +59,8 @@ appliance_new() {
         "$root$appliance_server_root"/{conf/extra,var,logs,htdocs}
     chmod 1777 "$root/tmp"
     : >"$root/dev/null"
+    : >"$root/dev/zero"
+    ln -s /proc/self/fd "$root/dev/fd"
     : >"$root/etc/mtab"
     printf 'root:x:0:0:root:/root:/bin/sh\nwww-data:x:%s:%s:www-data:/var/www:/usr/sbin/nologin\n' \
         "$appliance_www_id" "$appliance_www_id" >"$root/etc/passwd"
@@ -115,29 +117,61 @@ appliance_folder() {
     chown -R "$appliance_www_id:$appliance_www_id" "$1$2"
 }
 
-# appliance_catalogue ROOT: the share catalogue from lines on standard input,
+# catalogue_items ROOT: share catalogue items from lines on standard input,
 # NAME|PATH|READ_LIST|WRITE_LIST|INVALID_USERS|PUBLIC|WEB_PUBLIC; every
 # share's folder is made.
-appliance_catalogue() {
+catalogue_items() {
     local root=$1 name path read write invalid public web field value
-    {
-        printf '<?xml version="1.0" encoding="UTF-8"?>\n<config><samba>'
-        while IFS='|' read -r name path read write invalid public web; do
-            [[ -n $name ]] || continue
-            appliance_folder "$root" "$path"
-            printf '<item>'
-            for field in name path read_list write_list invalid_users public web_public; do
-                case $field in
-                name) value=$name ;; path) value=$path ;; read_list) value=$read ;;
-                write_list) value=$write ;; invalid_users) value=$invalid ;;
-                public) value=$public ;; web_public) value=$web ;;
-                esac
-                [[ -z $value ]] || printf '<%s>%s</%s>' "$field" "$(xml_escape "$value")" "$field"
-            done
-            printf '</item>'
+    while IFS='|' read -r name path read write invalid public web; do
+        [[ -n $name ]] || continue
+        appliance_folder "$root" "$path"
+        printf '<item>'
+        for field in name path read_list write_list invalid_users public web_public; do
+            case $field in
+            name) value=$name ;; path) value=$path ;; read_list) value=$read ;;
+            write_list) value=$write ;; invalid_users) value=$invalid ;;
+            public) value=$public ;; web_public) value=$web ;;
+            esac
+            [[ -z $value ]] || printf '<%s>%s</%s>' "$field" "$(xml_escape "$value")" "$field"
         done
-        printf '</samba></config>\n'
-    } >"$root/var/www/xml/smb.xml"
+        printf '</item>'
+    done
+}
+
+# appliance_catalogue ROOT: the share catalogue from catalogue_items lines on
+# standard input.
+appliance_catalogue() {
+    printf '<?xml version="1.0" encoding="UTF-8"?>\n<config><samba>%s</samba></config>\n' \
+        "$(catalogue_items "$1")" >"$1/var/www/xml/smb.xml"
+}
+
+# appliance_catalogue_add ROOT: adds catalogue_items lines to the catalogue.
+appliance_catalogue_add() {
+    local items
+    items=$(catalogue_items "$1")
+    items=${items//\\/\\\\}
+    items=${items//&/\\&}
+    sed -i "s|</samba></config>|${items//|/\\|}&|" "$1/var/www/xml/smb.xml"
+}
+
+# appliance_bench ROOT SHARES: the benchmark's users, groups and shares
+# (bench/make_root.awk) on volumes HD_a2, HD_b2 and HD_c2 of a new
+# appliance, in place of the demo's.
+appliance_bench() {
+    local root=$1 data
+    data=$(mktemp -d) || return 1
+    mkdir -p "$data"/{etc,var/www/xml,opt/bench} "$data"/mnt/HD/HD_{a,b,c}2/.system_data
+    awk -v root="$data" -v shares="$2" -f "$appliance_repo/bench/make_root.awk" |
+        sed "s|^|$root|" | xargs -d '\n' mkdir -p --
+    tail -n +2 "$data/etc/passwd" >>"$root/etc/passwd"
+    tail -n +2 "$data/etc/group" >>"$root/etc/group"
+    cp "$data/var/www/xml/smb.xml" "$root/var/www/xml/smb.xml"
+    local volume
+    for volume in a b c; do
+        appliance_mount "$root" "/mnt/HD/HD_${volume}2" "/dev/sd${volume}4"
+        cp -r "$data/mnt/HD/HD_${volume}2/.system_data" "$root/mnt/HD/HD_${volume}2/"
+    done
+    rm -rf "$data"
 }
 
 # share_list_items: WebDAV share list items from lines NAME|PATH|RW|ENABLE on
@@ -177,6 +211,7 @@ appliance_run() {
         done
         mount --rbind /proc "$root/proc"
         mount --bind /dev/null "$root/dev/null"
+        mount --bind /dev/zero "$root/dev/zero"
         exec chroot "$root" /usr/bin/env -i PATH="'"$appliance_path"'" "$@"
     ' appliance "$root" "$@"
 }

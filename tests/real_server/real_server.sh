@@ -3,11 +3,15 @@
 # and reached by real clients, in a throw-away demo appliance (with two more
 # shares whose names the configuration cannot carry: one would break the
 # file, one would name the server root).
-#   real_server.sh access|litmus|rclone|restarts|broken DAVSYNC
+#   real_server.sh access|litmus|rclone|restarts|broken|churn DAVSYNC
 # Status 77 (skipped) when not root.
 set -uo pipefail
 ((EUID == 0)) || { echo "the real-server tests need root: skipped"; exit 77; }
 source "$(dirname "${BASH_SOURCE[0]}")/../../appliance/appliance.sh"
+# Changes under load, at a size for CI (latency bounded loosely: the tool is
+# built with sanitizers); scripts/churn alone runs the full size.
+[[ $1 != churn ]] ||
+    exec "$appliance_repo/scripts/churn" --shares 0 --changes 3 --mb 32 --check --latency 1000 --davsync "$2"
 
 port=$(free_port)
 root=$(appliance_new "$2" "$port")
@@ -127,6 +131,21 @@ case_broken() {
     expect "refused again" 1 $?
     expect "started on the accepted configuration" "207 200 201" "$(public)"
     expect "the accepted configuration is back again" "$good" "$(cat "$conf")"
+    # Parses, but the server cannot open its log: taken back at once.
+    echo 'ErrorLog "/nonexistent/error_log"' >>"$conf"
+    apache restart dav
+    expect "a file the server cannot run fails" "1 207 200 201" "$? $(public)"
+    expect "and the accepted one is back" "$good" "$(cat "$conf")"
+    # Whatever a writer swaps in meanwhile, only what the server ran is accepted.
+    local round
+    cp "$conf" "$work/0"
+    { cat "$conf"; echo; } >"$work/1"
+    { cat "$conf"; echo Bogus; } >"$work/2"
+    (for round in {1..600}; do cp "$work/$((round % 3))" "$conf.x" && mv "$conf.x" "$conf"; done) &
+    for round in {1..10}; do apache restart dav; done
+    wait
+    expect "swapped: only a good file accepted, and served" "0 207 200 201" \
+        "$(grep -c Bogus "$conf.accepted") $(public)"
     local usage
     usage=$(apache reload dav 2>&1)
     expect "other arguments: status 2, one line" "2 1" "$? $(wc -l <<<"$usage")"
