@@ -23,23 +23,34 @@ struct NameNode {
 void free_name_list(NameNode *head);
 
 // The system's group database, read whole on the first look-up, for a run
-// that expands many lists, with the scratch index an expansion reuses.
+// that expands many lists. Every name the run meets gets a number once, so
+// that an expansion tells a name it took already by a mark on its number
+// rather than by hashing the name again.
 struct GroupTable {
     bool loaded;
-    NameIndex groups;  // group name -> its member chain (NameNode)
-    NameIndex seen;    // the names of the expansion under way
+    NameIndex groups;     // group name -> its record (members and their numbers)
+    NameIndex numbers;    // name -> its number + 1
+    const char **texts;   // number -> the name
+    bool *owned;          // number -> the text is the table's own copy
+    unsigned *marks;      // number -> the last mark put on it
+    size_t count;
+    size_t capacity;
+    unsigned mark;        // the latest mark
 };
 void group_table_init(GroupTable *table);
 void group_table_free(GroupTable *table);
 
-// An expansion's names in order. They are borrowed: from `work`, the cut
-// copy of the list text it owns, and from the group table.
+// An expansion's names in order, with their numbers. The names are
+// borrowed from the group table.
 struct NameArray {
     const char **names;
+    size_t *numbers;
     size_t count;
     size_t capacity;
-    char *work;
 };
+
+// A fresh mark, to put on the numbers of a set of names.
+unsigned new_name_mark(GroupTable *table);
 
 // Expands `list_text` (unchanged) with the groups of `table`. 0, or -1 when
 // memory runs out (what was gathered stays, and is the caller's to free).

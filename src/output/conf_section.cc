@@ -34,10 +34,11 @@ static bool append_user(char (&line)[LINE_BUFFER_WIDTH], size_t *used, const cha
     return true;
 }
 
-// Each name not refused is followed by one space; names that no longer fit
-// the line are left off, the line stops at the last one that does.
-static void write_user_line(FILE *conf, const NameArray *first, const NameArray *second,
-                            const NameIndex *refused) {
+// Each name not refused (marked `refused`) is followed by one space; names
+// that no longer fit the line are left off, the line stops at the last one
+// that does.
+static void write_user_line(FILE *conf, const GroupTable *groups, const NameArray *first,
+                            const NameArray *second, unsigned refused) {
     char line[LINE_BUFFER_WIDTH];
     size_t used = 0;
     append_user(line, &used, "\t\tRequire user");
@@ -45,7 +46,7 @@ static void write_user_line(FILE *conf, const NameArray *first, const NameArray 
     bool full = false;
     for (const NameArray *list : lists)
         for (size_t i = 0; list != nullptr && i < list->count && !full; ++i)
-            full = name_index_find(refused, list->names[i]) == nullptr && !append_user(line, &used, list->names[i]);
+            full = groups->marks[list->numbers[i]] != refused && !append_user(line, &used, list->names[i]);
     line[used] = '\n';
     fwrite(line, 1, used + 1, conf);
 }
@@ -56,16 +57,15 @@ static int expand_field(GroupTable *groups, const char *list_text, NameArray *na
     return 0;
 }
 
-// The readers and writers less the refused (invalid) users, whose names the
-// group table's scratch index holds while the lines are written.
+// The readers and writers less the refused (invalid) users, whose numbers
+// carry a mark of their own while the lines are written.
 static int write_authenticated_block(FILE *conf, GroupTable *groups, const ShareRecord *rules) {
     NameArray invalid, readers, writers;
-    int result = expand_field(groups, rules->invalid_users, &invalid);
-    result |= expand_field(groups, rules->read_list, &readers);
+    int result = expand_field(groups, rules->read_list, &readers);
     result |= expand_field(groups, rules->write_list, &writers);
-    name_index_clear(&groups->seen);
-    for (size_t i = 0; i < invalid.count; ++i)
-        if (name_index_add(&groups->seen, invalid.names[i], const_cast<char *>(invalid.names[i])) < 0) result = -1;
+    result |= expand_field(groups, rules->invalid_users, &invalid);
+    unsigned refused = new_name_mark(groups);
+    for (size_t i = 0; i < invalid.count; ++i) groups->marks[invalid.numbers[i]] = refused;
 
     fputs("\tAuthType Basic\n"
           "\tAuthName DAV-upload\n"
@@ -73,12 +73,12 @@ static int write_authenticated_block(FILE *conf, GroupTable *groups, const Share
           "\n"
           "\t<Limit GET HEAD PROPFIND OPTIONS>\n",
           conf);
-    write_user_line(conf, &readers, &writers, &groups->seen);
+    write_user_line(conf, groups, &readers, &writers, refused);
     fputs("\t</Limit>\n"
           "\n"
           "\t<LimitExcept GET PROPFIND HEAD OPTIONS>\n",
           conf);
-    write_user_line(conf, &writers, nullptr, &groups->seen);
+    write_user_line(conf, groups, &writers, nullptr, refused);
     fputs("\t</LimitExcept>\n"
           "\n",
           conf);
