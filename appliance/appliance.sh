@@ -1,16 +1,16 @@
 # shellcheck shell=bash
 # The appliance around davsync, for the demo and the real-server tests; meant
 # to be sourced by bash. An appliance is a root folder in $TMPDIR (or /tmp)
-# holding what the tool and its WebDAV server read and write at their fixed
-# paths. Both run chrooted into it inside a private mount namespace, with the
-# system's programs and libraries bound read-only, sharing the host's network:
-# the server listens on 127.0.0.1:PORT. Nothing is written outside the root.
-# Needs root (unshare, chroot, the server's user).
+# made by appliance/root, holding what the tool and its WebDAV server read and
+# write at their fixed paths. Both run chrooted into it through appliance/root
+# (a private mount namespace, the system bound read-only), sharing the host's
+# network: the server listens on 127.0.0.1:PORT. Nothing is written outside
+# the root. Needs root (unshare, chroot, the server's user).
 
 appliance_repo="$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)"
+appliance_root=$appliance_repo/appliance/root
 # Inside the root.
 appliance_server_root=/usr/local/apache2_dav
-appliance_path=/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin
 # The server's user, as in Debian's base-passwd.
 appliance_www_id=33
 
@@ -43,30 +43,14 @@ xml_escape() {
 
 # appliance_new DAVSYNC PORT: prints the new root's path.
 appliance_new() {
-    local davsync=$1 port=$2 root dir
+    local davsync=$1 port=$2 root
     root=$(mktemp -d "${TMPDIR:-/tmp}/davsync-appliance.XXXXXX") || return 1
     root=$(realpath "$root")
-    chmod 755 "$root"
-    for dir in /bin /sbin /lib /lib32 /lib64 /libx32 /usr/bin /usr/sbin /usr/lib /usr/lib32 \
-        /usr/lib64 /usr/libexec /usr/share; do
-        if [[ -L $dir ]]; then
-            mkdir -p "$root$(dirname "$dir")" && ln -s "$(readlink "$dir")" "$root$dir"
-        elif [[ -d $dir ]]; then
-            mkdir -p "$root$dir"
-        fi
-    done
-    mkdir -p "$root"/{proc,dev,tmp,etc/NAS_CFG,var/www/xml,mnt/HD,mnt/USB,usr/local/sbin} \
-        "$root$appliance_server_root"/{conf/extra,var,logs,htdocs}
-    chmod 1777 "$root/tmp"
-    : >"$root/dev/null"
-    : >"$root/dev/zero"
-    ln -s /proc/self/fd "$root/dev/fd"
-    : >"$root/etc/mtab"
-    printf 'root:x:0:0:root:/root:/bin/sh\nwww-data:x:%s:%s:www-data:/var/www:/usr/sbin/nologin\n' \
-        "$appliance_www_id" "$appliance_www_id" >"$root/etc/passwd"
-    printf 'root:x:0:\nwww-data:x:%s:\n' "$appliance_www_id" >"$root/etc/group"
-    printf 'passwd: files\ngroup: files\nhosts: files\n' >"$root/etc/nsswitch.conf"
-    printf '127.0.0.1 localhost\n' >"$root/etc/hosts"
+    "$appliance_root" make "$root" || return 1
+    mkdir -p "$root/usr/local/sbin" "$root$appliance_server_root"/{var,logs,htdocs}
+    printf 'www-data:x:%s:%s:www-data:/var/www:/usr/sbin/nologin\n' "$appliance_www_id" "$appliance_www_id" \
+        >>"$root/etc/passwd"
+    printf 'www-data:x:%s:\n' "$appliance_www_id" >>"$root/etc/group"
     : >"$root/etc/passwd.webdav"
     chown "0:$appliance_www_id" "$root/etc/passwd.webdav"
     chmod 640 "$root/etc/passwd.webdav"
@@ -75,7 +59,6 @@ appliance_new() {
     appliance_main_conf "$port" >"$root$appliance_server_root/conf/httpd.conf"
     # The lock database: without it every write answers 500.
     chown "$appliance_www_id:$appliance_www_id" "$root$appliance_server_root/var"
-    appliance_switch "$root" 1
     echo "$root"
 }
 
@@ -86,8 +69,7 @@ appliance_main_conf() {
 
 # appliance_switch ROOT 0|1: the WebDAV switch in the configuration database.
 appliance_switch() {
-    printf '<config><system_mgr><webdav><enable>%s</enable></webdav><samba><ads_enable>0</ads_enable></samba></system_mgr></config>\n' \
-        "$2" >"$1/etc/NAS_CFG/config_db.xml"
+    sed -i "s|<webdav><enable>[01]</enable>|<webdav><enable>$2</enable>|" "$1/etc/NAS_CFG/config_db.xml"
 }
 
 # appliance_user ROOT NAME PASSWORD: an account with a WebDAV password.
@@ -195,25 +177,13 @@ appliance_share_list() {
     share_list_items >"$1$2/.system_data/${3:-lighty.xml}"
 }
 
-# appliance_run ROOT COMMAND...: runs a command chrooted into the root, in a
-# mount namespace of its own, with PATH as its whole environment. What it
-# leaves running (the server) keeps that namespace; the mounts go with it.
+# appliance_run ROOT COMMAND...: runs a command in the root, with PATH as its
+# whole environment. What it leaves running (the server) keeps the namespace
+# and its mounts.
 appliance_run() {
     local root=$1
     shift
-    unshare --mount --propagation private --fork -- /bin/bash -c '
-        set -e
-        root=$1
-        shift
-        for dir in /bin /sbin /lib /lib32 /lib64 /libx32 /usr/bin /usr/sbin /usr/lib /usr/lib32 \
-            /usr/lib64 /usr/libexec /usr/share; do
-            [[ -d $dir && ! -L $dir ]] && mount --bind -o ro "$dir" "$root$dir"
-        done
-        mount --rbind /proc "$root/proc"
-        mount --bind /dev/null "$root/dev/null"
-        mount --bind /dev/zero "$root/dev/zero"
-        exec chroot "$root" /usr/bin/env -i PATH="'"$appliance_path"'" "$@"
-    ' appliance "$root" "$@"
+    "$appliance_root" enter "$root" -- "$@"
 }
 
 # Stops the server, ends what else still runs in the root (by pid, and then

@@ -55,7 +55,7 @@ TEST(Harness, IsolatesEachRunAndLeavesNothingBehind) {
         Appliance box;
         root = box.host("");
         EXPECT_EQ(box.run({}, {{}, 0, "/usr/bin/env"}).out,
-                  "PATH=/opt/recorder:/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin\n");
+                  "PATH=/opt/bin:/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin\n");
         box.plant_fifo("/tmp/fifo");
         RunResult sh = box.run({"-c", "test -p /tmp/fifo && touch /usr/bin/x; yes | head -c 99999 > /tmp/x"},
                                {{{"/tmp", "16k"}}, 0, "/bin/sh"});

@@ -70,20 +70,19 @@ struct State {
 
 State snapshot(const Appliance &box) {
     State state;
-    for (const std::string &top : {std::string(""), std::string("/usr/local")})
-        for (auto it = fs::recursive_directory_iterator(box.host(top)); it != fs::recursive_directory_iterator(); ++it) {
-            std::string path = top + it->path().string().substr(box.host(top).size());
-            std::string name = it->path().filename(), folder = it->path().parent_path().filename();
-            if (path == "/proc") it.disable_recursion_pending();
-            if (path == "/dev/log" || path == "/var/log/apache_calls" || path == "/opt/preload") continue;
-            auto status = it->symlink_status();
-            state.entries[path] = "-fdlbcpsu"[int(status.type()) & 7] + std::to_string(int(status.permissions())) + " " +
-                                  (fs::is_regular_file(status) ? box.read(path) : box.link_target(path));
-            if (((name == "lighty.xml" || name == ISO) && folder == ".system_data") || name == ".davconf" || path == CONF ||
-                path == QUERY)
-                state.kept[path] = box.read(path);
-            if (it->path().parent_path() == box.host(LINKS)) state.links[name] = box.link_target(path);
-        }
+    for (auto it = fs::recursive_directory_iterator(box.host("")); it != fs::recursive_directory_iterator(); ++it) {
+        std::string path = it->path().string().substr(box.host("").size());
+        std::string name = it->path().filename(), folder = it->path().parent_path().filename();
+        if (path == "/proc") it.disable_recursion_pending();
+        if (path == "/dev/log" || path == "/var/log/apache_calls" || path == "/opt/preload") continue;
+        auto status = it->symlink_status();
+        state.entries[path] = "-fdlbcpsu"[int(status.type()) & 7] + std::to_string(int(status.permissions())) + " " +
+                              (fs::is_regular_file(status) ? box.read(path) : box.link_target(path));
+        if (((name == "lighty.xml" || name == ISO) && folder == ".system_data") || name == ".davconf" || path == CONF ||
+            path == QUERY)
+            state.kept[path] = box.read(path);
+        if (it->path().parent_path() == box.host(LINKS)) state.links[name] = box.link_target(path);
+    }
     state.note = box.exists(NOTE) ? box.read(NOTE) : GONE;
     state.calls = box.read("/var/log/apache_calls");
     return state;
@@ -98,12 +97,10 @@ std::string at(const State &state, const std::string &path) {
 void restore(const Appliance &from, Appliance &to) {
     for (const auto &entry : fs::directory_iterator(to.host("")))
         if (entry.path().filename() != "dev") fs::remove_all(entry.path());
-    fs::remove_all(to.host("/usr/local"));
     for (const auto &entry : fs::directory_iterator(from.host("")))
         if (entry.path().filename() != "dev")
             fs::copy(entry.path(), to.host("/" + entry.path().filename().string()),
                      fs::copy_options::recursive | fs::copy_options::copy_symlinks);
-    fs::copy(from.host("/usr/local"), to.host("/usr/local"), fs::copy_options::recursive | fs::copy_options::copy_symlinks);
 }
 
 struct Runner {

@@ -83,18 +83,9 @@ Appliance::Appliance() {
     if (mkdtemp(pattern.data()) == nullptr) throw std::runtime_error("appliance harness: mkdtemp " + pattern);
     dir_ = fs::canonical(pattern);  // chrooted into: no link on the way
     root_ = dir_ + "/root";
-    for (const char *folder : {"/tmp", "/var/www/xml", "/var/log", "/mnt/HD", "/proc", "/usr/local/apache2_dav/conf/extra"})
-        make_dir(folder);
-    fs::permissions(host("/tmp"), fs::perms::all | fs::perms::sticky_bit);
-    for (const char *dir : {"/bin", "/sbin", "/lib", "/lib32", "/lib64", "/usr"})  // bound or linked as on the host
-        if (fs::is_symlink(dir)) fs::create_symlink(fs::read_symlink(dir), host(dir));
-        else if (fs::is_directory(dir)) make_dir(dir);
-    for (const auto &[path, text] : std::map<std::string, std::string>{
-             {"/etc/mtab", ""}, {"/etc/passwd", "root:x:0:0:root:/root:/bin/sh\n"}, {"/etc/group", "root:x:0:\n"},
-             {"/etc/nsswitch.conf", "passwd: files\ngroup: files\n"}, {"/dev/null", ""}})
-        write(path, text);
-    write("/opt/recorder/apache", "#!/bin/sh\necho \"$*\" >> /var/log/apache_calls\n", 0755);
-    write("/opt/program", "", 0755);  // the program of a run is bound here
+    finish(spawn({"sh", DAVSYNC_APPLIANCE_ROOT, "make", root_}));
+    write("/opt/bin/apache", "#!/bin/sh\necho \"$*\" >> /var/log/apache_calls\n", 0755);
+    write("/opt/program", "", 0755);  // the program of a run is bound here: made now, it is in every snapshot
     config_ = {{"/system_mgr/webdav/enable", "1"}, {"/system_mgr/samba/ads_enable", "0"}};
     write_config();
     std::string log_path = host("/dev/log");
@@ -199,14 +190,19 @@ RunResult Appliance::run(const std::vector<std::string> &args, const RunOptions 
 }
 
 pid_t Appliance::start(const std::vector<std::string> &args, const RunOptions &options) {
-    std::vector<std::string> words = {"unshare", "--mount", "--pid", "--kill-child=SIGKILL", "--fork", "sh", DAVSYNC_ENTER_ROOT,
-                                      root_, options.program.empty() ? DAVSYNC_STAGED_BINARY : options.program};
-    if (geteuid() != 0) words.insert(words.begin() + 1, {"--user", "--map-root-user"});
-    for (const auto &[inside, size] : options.tmpfs) words.insert(words.end(), {inside, size});
-    words.insert(words.end(), options.env.begin(), options.env.end());
-    if (!options.preload.empty()) words.push_back("LD_PRELOAD=" + options.preload);
-    words.push_back("--");
+    std::vector<std::string> words = {"sh", DAVSYNC_APPLIANCE_ROOT, "enter", "--pid", "--umask", "077", "--bind",
+                                      options.program.empty() ? DAVSYNC_STAGED_BINARY : options.program, "/opt/program"};
+    for (const auto &[inside, size] : options.tmpfs) words.insert(words.end(), {"--tmpfs", inside, size});
+    for (const std::string &variable : options.env) words.insert(words.end(), {"--env", variable});
+    if (!options.preload.empty()) words.insert(words.end(), {"--preload", options.preload});
+    if (fs::is_directory(host("/opt/alongside")))
+        for (const auto &entry : fs::directory_iterator(host("/opt/alongside"))) words.insert(words.end(), {"--beside", entry.path()});
+    words.insert(words.end(), {root_, "--", "/opt/program"});
     words.insert(words.end(), args.begin(), args.end());
+    return spawn(words);
+}
+
+pid_t Appliance::spawn(std::vector<std::string> words) {
     std::vector<char *> argv;
     for (std::string &word : words) argv.push_back(word.data());
     argv.push_back(nullptr);
@@ -219,7 +215,7 @@ pid_t Appliance::start(const std::vector<std::string> &args, const RunOptions &o
         if (!freopen("/dev/null", "r", stdin) || !freopen((output + ".out").c_str(), "w", stdout) ||
             !freopen((output + ".err").c_str(), "w", stderr))
             _exit(125);
-        execvp("unshare", argv.data());
+        execvp(argv[0], argv.data());
         _exit(125);
     }
     if (pid < 0) ADD_FAILURE() << "appliance harness: fork failed";
@@ -246,7 +242,7 @@ RunResult Appliance::finish(pid_t pid) {
     running_.erase(found);
     RunResult run{WIFEXITED(raw) ? WEXITSTATUS(raw) : 128 + WTERMSIG(raw), slurp(output + ".out"), slurp(output + ".err")};
     if (run.status == 125 || run.err.rfind("unshare:", 0) == 0)
-        ADD_FAILURE() << "appliance harness: no private mount namespace, or its set-up failed:\n" << run.err;
+        ADD_FAILURE() << "appliance harness: the root could not be made or entered:\n" << run.err;
     return run;
 }
 

@@ -1,13 +1,14 @@
 // A fresh appliance root per Appliance, in a temporary folder that goes with
-// it. run() executes the installed davsync chrooted into the root inside
-// private mount and PID namespaces (util-linux unshare, then enter_root.sh),
-// with the host's /usr (but /usr/local) and /lib* bound read-only, /dev/null
-// bound, a /proc of its own, umask 077 and PATH as the only environment
-// variable (and what a run adds). Executables in /opt/alongside start beside
-// it (outside the chroot): only they and the run's own processes are seen in
-// /proc. A recording "apache" first on PATH appends its arguments as one line
-// to /var/log/apache_calls. A datagram socket at /dev/log takes what the runs
-// send to syslog. Every path a member takes is a path inside the root.
+// it, made and entered through appliance/root. run() executes the installed
+// davsync (bound at /opt/program) chrooted into the root inside private mount
+// and PID namespaces, with the host's system folders but /usr/local bound
+// read-only, /dev/null and /dev/zero bound, a /proc of its own, umask 077 and
+// PATH as the only environment variable (and what a run adds). Executables
+// in /opt/alongside start beside it (outside the chroot): only they and the
+// run's own processes are seen in /proc. A recording "apache" first on PATH
+// appends its arguments as one line to /var/log/apache_calls. A datagram
+// socket at /dev/log takes what the runs send to syslog. Every path a member
+// takes is a path inside the root.
 #ifndef DAVSYNC_TESTS_HARNESS_APPLIANCE_H
 #define DAVSYNC_TESTS_HARNESS_APPLIANCE_H
 
@@ -45,11 +46,7 @@ public:
     Appliance(const Appliance &) = delete;
     Appliance &operator=(const Appliance &) = delete;
 
-    // Where a path inside is found from outside: /usr/local is kept apart from
-    // the root, since the host's /usr is bound over the root's.
-    std::string host(const std::string &inside) const {
-        return inside.rfind("/usr/local", 0) == 0 ? dir_ + "/usr_local" + inside.substr(10) : root_ + inside;
-    }
+    std::string host(const std::string &inside) const { return root_ + inside; }  // where it is found from outside
     void write(const std::string &inside, const std::string &content, mode_t mode = 0644);  // parents made
     std::string read(const std::string &inside) const;  // "" when missing
     bool exists(const std::string &inside) const;       // a dangling link counts
@@ -79,6 +76,7 @@ public:
     std::vector<std::string> log_lines();  // every message sent to /dev/log so far, in order
 
 private:
+    pid_t spawn(std::vector<std::string> words);  // output to numbered files, reaped by finish()
     void write_config();
     std::string dir_, root_;
     std::map<std::string, std::string> config_;
