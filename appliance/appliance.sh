@@ -56,6 +56,7 @@ appliance_new() {
     chmod 640 "$root/etc/passwd.webdav"
     install -m 755 "$davsync" "$root/usr/local/sbin/davsync"
     install -m 755 "$appliance_repo/appliance/apache" "$root/usr/local/sbin/apache"
+    install -D -m 644 -t "$root/usr/local/lib/apache" "$appliance_repo"/appliance/*.awk
     appliance_main_conf "$port" >"$root$appliance_server_root/conf/httpd.conf"
     # The lock database: without it every write answers 500.
     chown "$appliance_www_id:$appliance_www_id" "$root$appliance_server_root/var"
