@@ -15,10 +15,11 @@ std::string answer(const std::string &name, const std::string &path, int enable 
 const std::string EARLIER(3000, 'e');
 // Each fits its field, but not once escaped.
 const std::string LONG_NAME = std::string(240, 'n') + "&&&&", LONG_PATH = "/" + std::string(230, 'p') + "&&&&&";
+const std::string WIDEST_NAME(255, 'w');  // fills its field exactly
 
 void for_get(Appliance &box) {
     box.write_list(A2, {{"Public", "/Public"}, {"a&b \"q\"", "/Music"}, {"Whole", "/"}, {"R&D", "/R&D"},
-                        {LONG_NAME, "/Long"}, {"Deep", LONG_PATH}, {"Later", "/Public"}});
+                        {LONG_NAME, "/Long"}, {"Deep", LONG_PATH}, {"Later", "/Public"}, {WIDEST_NAME, "/Widest"}});
     box.write(QUERY, EARLIER);
 }
 void get_off(Appliance &box) { for_get(box), box.set_config(ENABLE, "0"); }
@@ -75,6 +76,7 @@ const Row ROWS[] = {
     {"get volume root", for_get, {{QUERY, answer("Whole", A2 + "/")}}, {"get", A2}, {}},
     {"get escapes", for_get, {{QUERY, answer("a&amp;b &quot;q&quot;", A2 + "/Music")}}, {"get", A2 + "/Music"}, {}},
     {"get decodes", for_get, {{QUERY, answer("R&amp;D", A2 + "/R&amp;D")}}, {"get", A2 + "/R&amp;D"}, {}},
+    {"get a name that fills its field", for_get, {{QUERY, answer(WIDEST_NAME, A2 + "/Widest")}}, {"get", A2 + "/Widest"}, {}},
     {"get escaped name too long", for_get, {{QUERY, EARLIER}}, {"get", A2 + "/Long"}, {}},
     {"get escaped path too long", for_get, {{QUERY, EARLIER}}, {"get", A2 + LONG_PATH}, {}},
     {"get USB folder of 13", for_get, {{QUERY, answer("USB1/", "/mnt/USB/USB1/")}}, {"get", "/mnt/USB/USB1"}, {}},
