@@ -95,3 +95,25 @@ int path_exists(const char *path) {
     if (is_absent_error(errno) || errno == ELOOP || errno == ENAMETOOLONG) return 0;
     return -1;
 }
+
+bool file_holds(const char *path, const char *data, size_t length) {
+    int fd = open(path, O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY | O_NOFOLLOW);
+    if (fd == -1) return false;
+    struct stat status;
+    bool same = fstat(fd, &status) == 0 && S_ISREG(status.st_mode) && static_cast<size_t>(status.st_size) == length;
+    char piece[65536];
+    size_t compared = 0;
+    while (same && compared < length) {
+        ssize_t got = read(fd, piece, sizeof piece);
+        if (got < 0 && errno == EINTR) continue;
+        same = got > 0 && static_cast<size_t>(got) <= length - compared && memcmp(piece, data + compared, static_cast<size_t>(got)) == 0;
+        if (same) compared += static_cast<size_t>(got);
+    }
+    if (same) {  // nothing past the size it had
+        ssize_t got;
+        do got = read(fd, piece, 1); while (got < 0 && errno == EINTR);
+        same = got == 0;
+    }
+    close(fd);
+    return same;
+}

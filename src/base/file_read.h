@@ -31,6 +31,11 @@ FileState read_whole_file(const char *path, FileBytes *bytes, int flags);
 FileState read_whole_file_at(int dir_fd, const char *name, FileBytes *bytes, int flags);
 void free_file_bytes(FileBytes *bytes);
 
+// Whether `path` is a regular file (its last step not a link) holding
+// exactly `length` bytes equal to `data`. Compared piece by piece, so that a
+// large file is never held twice; any failure answers false.
+bool file_holds(const char *path, const char *data, size_t length);
+
 // Whether `path` names something: 1 yes, 0 no (ENOENT, ENOTDIR, ELOOP,
 // ENAMETOOLONG: states of the data), -1 when the system could not tell
 // (errno set). Links are followed.

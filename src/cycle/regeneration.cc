@@ -7,6 +7,7 @@
 
 #include "base/appliance_paths.h"
 #include "base/file_read.h"
+#include "base/memory_file.h"
 #include "base/safe_file.h"
 #include "base/shell_command.h"
 #include "base/text_field.h"
@@ -155,14 +156,7 @@ int stage_lists(CycleRun *run) {
     return result;
 }
 
-// Whether the file at `path` holds exactly `text` (a link there never does).
-bool holds(const char *path, const MemoryFile &text) {
-    FileBytes bytes = {};
-    bool same = read_whole_file(path, &bytes, READ_NO_LINK) == FileState::read && bytes.length == text.length &&
-                memcmp(bytes.data, text.text, text.length) == 0;
-    free_file_bytes(&bytes);
-    return same;
-}
+bool holds(const char *path, const MemoryFile &text) { return file_holds(path, text.text, text.length); }
 
 // Staged only when it differs from the placed one.
 int stage_conf(CycleRun *run, const MemoryFile &conf) {
