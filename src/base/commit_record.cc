@@ -12,6 +12,7 @@
 #include "base/appliance_paths.h"
 #include "base/file_read.h"
 #include "base/record_list.h"
+#include "base/memory_file.h"
 #include "base/safe_file.h"
 #include "base/text_field.h"
 

@@ -1,6 +1,7 @@
 #include "base/safe_file.h"
 
 #include <cerrno>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <dirent.h>
@@ -244,27 +245,4 @@ int open_dir_no_links(const char *path) {
 
 bool is_not_reachable(int error) {
     return error == ENOENT || error == ENOTDIR || error == ELOOP || error == EINVAL;
-}
-
-int memory_file_open(MemoryFile *file) {
-    file->text = nullptr;
-    file->length = 0;
-    file->stream = open_memstream(&file->text, &file->length);
-    return file->stream != nullptr ? 0 : -1;
-}
-
-int memory_file_close(MemoryFile *file) {
-    if (file->stream == nullptr) return -1;
-    bool failed = ferror(file->stream) != 0;
-    failed = fclose(file->stream) != 0 || failed;
-    file->stream = nullptr;
-    return failed ? -1 : 0;
-}
-
-void memory_file_free(MemoryFile *file) {
-    if (file->stream != nullptr) fclose(file->stream);
-    free(file->text);
-    file->stream = nullptr;
-    file->text = nullptr;
-    file->length = 0;
 }

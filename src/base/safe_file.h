@@ -7,7 +7,6 @@
 #define DAVSYNC_BASE_SAFE_FILE_H
 
 #include <cstddef>
-#include <cstdio>
 #include <sys/types.h>
 
 // open(2) that never follows a link at the last step, never blocks on a FIFO
@@ -53,17 +52,5 @@ bool is_not_reachable(int error);
 // Removes whatever is at `name` in `dir_fd`: a folder with everything in it,
 // never following a link inside. 0, or -1 (errno).
 int remove_tree_at(int dir_fd, const char *name);
-
-// A stream into memory for a file built whole before it is written, so that
-// every write failure shows once, at the end.
-struct MemoryFile {
-    FILE *stream;
-    char *text;
-    size_t length;
-};
-[[nodiscard]] int memory_file_open(MemoryFile *file);
-// Closes the stream; 0 when everything written is in file->text.
-[[nodiscard]] int memory_file_close(MemoryFile *file);
-void memory_file_free(MemoryFile *file);
 
 #endif

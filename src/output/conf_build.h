@@ -6,7 +6,7 @@
 
 #include "access/user_list.h"
 #include "base/name_index.h"
-#include "base/safe_file.h"
+#include "base/memory_file.h"
 #include "output/link_dir.h"
 
 struct ConfBuild {

@@ -10,6 +10,7 @@
 #include <unistd.h>
 
 #include "base/appliance_paths.h"
+#include "base/memory_file.h"
 #include "base/safe_file.h"
 #include "base/text_field.h"
 #include "platform/volume_lib.h"
