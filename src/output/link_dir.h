@@ -15,8 +15,8 @@ struct LinkRequest {
     LinkRequest *next;
 };
 
-// A link name must name an entry directly in the link directory: a '/' or a
-// name of "." or ".." would let a share name place a link elsewhere.
+// A link name must name an entry directly in the link directory: "", a '/' or
+// a name of "." or ".." would let a share name place a link elsewhere.
 bool is_link_name(const char *shared_name);
 // Adds a request at the front of `*list`; names that are no link names, and
 // texts too long to hold, are not requested (0). -1 when memory runs out.

@@ -5,8 +5,8 @@
 
 static void append_volume(ConfBuild *build, const UsbVolume *volume) {
     const char *name = volume->shared_name;
-    // A volume whose name was not found would alias the server's root.
-    if (name[0] == '\0' || !is_conf_safe_name(name)) return;
+    // A volume whose name was not found ("") would alias the server's root.
+    if (!is_conf_safe_name(name)) return;
     if (publish_name(build, name) < 0) return;
     if (write_share_section(build->conf.stream, &build->groups, name, true, volume->rules) != 0)
         build->failed = true;
