@@ -3,6 +3,8 @@
 //   DAVSYNC_FAULT=count    every call is reported, "call K NAME", on stderr
 //   DAVSYNC_FAULT=K:ERRNO  the K-th call fails with ERRNO ("fault K NAME")
 //   DAVSYNC_FAULT=K:kill   SIGKILL just before the K-th call ("kill K NAME")
+//   DAVSYNC_FAULT=short    nothing fails, but every read and write moves at
+//                          most 3 bytes, as a pipe or a proc file may
 // Only the first process counts; the shells it starts do not see the shim.
 #define _GNU_SOURCE
 #include <dirent.h>
@@ -19,7 +21,7 @@
 #include <unistd.h>
 
 static long target, counted;
-static int fault_errno, kill_at, report_all;
+static int fault_errno, kill_at, report_all, short_io;
 static pid_t own_pid;
 
 __attribute__((constructor)) static void setup(void) {
@@ -28,6 +30,7 @@ __attribute__((constructor)) static void setup(void) {
     if (setting != NULL) {
         char *rest;
         report_all = strcmp(setting, "count") == 0;
+        short_io = strcmp(setting, "short") == 0;
         target = strtol(setting, &rest, 10);
         if (*rest == ':') kill_at = strcmp(rest + 1, "kill") == 0, fault_errno = atoi(rest + 1);
     }
@@ -53,6 +56,8 @@ static int strikes(const char *name) {
     return 1;
 }
 
+static size_t cut(size_t size) { return short_io && size > 3 && (pid_t)syscall(SYS_getpid) == own_pid ? 3 : size; }
+
 #define REAL(name) static __typeof__(name) *real; if (!real) real = (__typeof__(name) *)dlsym(RTLD_NEXT, #name)
 
 // A call that fails without taking effect.
@@ -77,11 +82,11 @@ FAILS(FILE *, fopen, (const char *path, const char *mode), (path, mode), NULL)
 FAILS(FILE *, fopen64, (const char *path, const char *mode), (path, mode), NULL)
 FAILS(DIR *, opendir, (const char *path), (path), NULL)
 FAILS(DIR *, fdopendir, (int fd), (fd), NULL)
-FAILS(ssize_t, read, (int fd, void *buffer, size_t size), (fd, buffer, size), -1)
-FAILS(ssize_t, __read_chk, (int fd, void *buffer, size_t size, size_t room), (fd, buffer, size, room), -1)
-FAILS(ssize_t, pread, (int fd, void *buffer, size_t size, off_t at), (fd, buffer, size, at), -1)
-FAILS(ssize_t, pread64, (int fd, void *buffer, size_t size, off_t at), (fd, buffer, size, at), -1)
-FAILS(ssize_t, write, (int fd, const void *buffer, size_t size), (fd, buffer, size), -1)
+FAILS(ssize_t, read, (int fd, void *buffer, size_t size), (fd, buffer, cut(size)), -1)
+FAILS(ssize_t, __read_chk, (int fd, void *buffer, size_t size, size_t room), (fd, buffer, cut(size), room), -1)
+FAILS(ssize_t, pread, (int fd, void *buffer, size_t size, off_t at), (fd, buffer, cut(size), at), -1)
+FAILS(ssize_t, pread64, (int fd, void *buffer, size_t size, off_t at), (fd, buffer, cut(size), at), -1)
+FAILS(ssize_t, write, (int fd, const void *buffer, size_t size), (fd, buffer, cut(size)), -1)
 FAILS(int, fsync, (int fd), (fd), -1)
 FAILS(int, fdatasync, (int fd), (fd), -1)
 FAILS_AFTER(int, close, (int fd), (fd), -1)
