@@ -37,16 +37,10 @@ int staged_name_of(const char *name, char (&staged)[NAME_WIDTH]) {
                              STAGED_SUFFIX);
 }
 
-// A staged file that is gone was renamed by an earlier attempt.
 int rename_staged(int dir_fd, const char *name) {
     char staged[NAME_WIDTH];
     if (staged_name_of(name, staged) != 0) return errno = ENAMETOOLONG, -1;
-    if (renameat(dir_fd, staged, dir_fd, name) == 0) return 0;
-    struct stat status;
-    if (errno == ENOENT && fstatat(dir_fd, staged, &status, AT_SYMLINK_NOFOLLOW) != 0 &&
-        errno == ENOENT)
-        return 0;
-    return -1;
+    return renameat(dir_fd, staged, dir_fd, name);
 }
 
 // Markers live in folders of whoever plugged the volume in: no link on the
@@ -82,7 +76,8 @@ int apply_step(const ChangeStep *step, const char *command, RunFailure *failure)
         errno = error;
     }
     if (result == 0) return 0;
-    // The volume or folder went away since: there is nothing left to change there.
+    // The staged file was renamed by an earlier attempt, or the volume or
+    // folder went away since: there is nothing left to change there.
     if (errno == ENOENT) return 0;
     if (step->kind != CHANGE_REPLACE && is_put_in_the_way(errno)) {
         log_event(LOG_WARNING, "%s: passed over %s: %m", command, step->path);
