@@ -40,6 +40,7 @@ const Row ROWS[] = {
                              {std::string(256, 'n'), "/Photos"}}, 7);  // a name too long for its field
          box.write_list(B2, {{"Backup", "/Backup", 1, 0}, {"Root", "/"}}, 7);  // named after the first share below
          box.write_list(B2, ISO_ITEMS, 7, ISO);  // only the first readable iso list counts
+         box.write(list_of(A2, ISO), "<refused");  // rewritten: every entry is in the one read
          box.make_dir(A2 + "/Gone"), box.make_dir("/mnt/HD/HD_c2");
          box.write(LINKS + "/stale", ""), box.write(NOTE, "stale\n");
      },
@@ -49,7 +50,8 @@ const Row ROWS[] = {
       {list_of(D2, ISO), share_list_xml(1, ISO_ITEMS)}, {CONF, START_CONF},
       {NOTE, "Public\nMusic\nBackup\nBackup\nDocs\nDisc\nusbdisk1\n"}, {LINKS + "/", "Disc Docs Music Public usbdisk1"},
       {LINKS + "/Public", "-> " + A2 + "/Public"}, {LINKS + "/usbdisk1", "-> /mnt/USB/USB1"},
-      {"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}, {"/tmp/dav.conf", GONE}}},
+      {"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}, {"/tmp/dav.conf", GONE}},
+     {"start"}, {"restart dav"}, 0, {"cannot use " + list_of(A2, ISO)}},
     {"stop keeps what matches name and path, all off, only the USB link",
      [](Appliance &box) {
          box.write("/tmp/corvane_start_lock", "");
