@@ -1,4 +1,8 @@
 // start, stop and get through the installed binary, and the node lock.
+#include <sys/stat.h>
+
+#include <algorithm>
+
 #include "appliance/fixture.h"
 
 using namespace fixture;
@@ -93,6 +97,25 @@ const Row ROWS[] = {
 class StartStopGet : public testing::TestWithParam<Row> {};
 TEST_P(StartStopGet, LeaveExactlyTheseFiles) { check(GetParam(), realistic); }
 INSTANTIATE_TEST_SUITE_P(Rows, StartStopGet, testing::ValuesIn(ROWS));
+
+// Volumes spin down: a start that changes nothing writes no list again.
+TEST(StartStop, ASecondStartRewritesNothing) {
+    Appliance box;
+    realistic(box);
+    box.run({"start"});
+    auto inodes = [&box] {
+        std::vector<ino_t> found;
+        for (const std::string &path : {list_of(A2), list_of(B2), list_of(D2), list_of(A2, ISO), CONF}) {
+            struct stat status {};
+            found.push_back(stat(box.host(path).c_str(), &status) == 0 ? status.st_ino : 0);
+        }
+        return found;
+    };
+    std::vector<ino_t> first = inodes();
+    EXPECT_EQ(std::count(first.begin(), first.end(), 0), 0);
+    box.run({"start"});
+    EXPECT_EQ(inodes(), first);
+}
 
 // Every release removes the lock file, yet no two holders ever overlap.
 TEST(NodeLock, ManyContendingProcessesAreNeverInsideTogether) {
