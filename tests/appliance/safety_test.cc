@@ -103,7 +103,8 @@ TEST(Safety, AListTheReaderRefusesIsKept) {
     for (const std::string &refused :
          {std::string(), list + "\t\t<count>2", std::string("\xff\xfe not xml"), list + "<!-- x -->" + counts + item + end,
           list + "<?pi x?>" + counts + item + end, list + item + counts + end, list + "<count>1</count>" + item + end,
-          "<!DOCTYPE c>" + list + counts + item + end, "<config>text" + list.substr(list.find("\t<")) + counts + end}) {
+          "<!DOCTYPE c>" + list + counts + item + end, "<config>text" + list.substr(list.find("\t<")) + counts + end,
+          [] { std::string own = share_list_xml(1, {{"aXb", "/Public"}}); return own.replace(own.find("aXb"), 3, "a]]>b"); }()}) {
         SCOPED_TRACE(refused);
         Appliance box;
         realistic(box);
