@@ -16,8 +16,8 @@ namespace {
 
 constexpr char STAGED_MARKER[] = ".davconf.davsync";
 
-void refuse(const char *command, const char *folder, const char *why) {
-    log_event(LOG_WARNING, "%s: refused to mark %s: %s", command, folder, why);
+void refuse(const char *command, bool mark, const char *folder, const char *why) {
+    log_event(LOG_WARNING, "%s: refused to %s %s: %s", command, mark ? "mark" : "unmark", folder, why);
 }
 
 // What stands at the marker's name: 0 nothing, 1 this user's regular file,
@@ -65,7 +65,7 @@ int stage_usb_mark(ChangeSet *changes, const char *folder, bool mark, const char
     int folder_fd = open_dir_no_links(folder);
     if (folder_fd == -1) {
         if (!is_not_reachable(errno)) return note_failure(failure, "cannot open the folder", folder, errno);
-        if (errno == ELOOP || errno == EINVAL) refuse(command, folder, "a link or a dot name on the way");
+        if (errno == ELOOP || errno == EINVAL) refuse(command, mark, folder, "a link or a dot name on the way");
         return 0;
     }
     int kind = marker_kind(folder_fd, USB_MARKER);
@@ -73,7 +73,7 @@ int stage_usb_mark(ChangeSet *changes, const char *folder, bool mark, const char
     if (kind < 0) {
         result = note_failure(failure, "cannot tell what stands at", marker, errno);
     } else if (kind == 2 || (mark && kind == 3)) {
-        refuse(command, folder, "something else stands at the marker's name");
+        refuse(command, mark, folder, "something else stands at the marker's name");
     } else if (!mark && kind == 0) {
     } else if (mark && write_staged_marker(folder_fd) != 0) {
         result = note_failure(failure, "cannot stage the marker of", folder, errno);
