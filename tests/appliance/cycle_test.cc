@@ -56,6 +56,10 @@ const Row ROWS[] = {
       {LINKS + "/Public", "-> " + A2 + "/Public"}, {LINKS + "/usbdisk1", "-> /mnt/USB/USB1"},
       {"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}, {"/tmp/dav.conf", GONE}},
      {"start"}, {"restart dav"}, 0, {"cannot use " + list_of(A2, ISO)}},
+    {"start removes a marker an interrupted run staged on a USB volume",
+     [](Appliance &box) { box.write("/mnt/USB/USB1/.davconf.davsync", "ON"); },
+     {{"/mnt/USB/USB1/.davconf.davsync", GONE}, {"/mnt/USB/USB1/.davconf", "ON"}}, {"start"}, {"restart dav"}, 0,
+     {"start: discarded what an interrupted run left (1 files)"}},
     {"stop keeps what matches name and path, all off, only the USB link",
      [](Appliance &box) {
          box.write("/tmp/corvane_start_lock", "");
