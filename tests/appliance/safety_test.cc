@@ -210,6 +210,18 @@ TEST(Safety, ConcurrentRunsLoseNoEditAndLeaveNoMark) {
     for (const std::string &line : lines) EXPECT_NE(line.find("cleared what another user planted at /tmp/corvane.node"), line.npos) << line;
 }
 
+// A folder mounted at the lock's name cannot be cleared: the run takes
+// the failure exit and changes nothing.
+TEST(Safety, ALockThatCannotBeHadChangesNothing) {
+    Appliance box;
+    realistic(box);
+    std::string list = box.read(A2_LIST);
+    expect_quiet(box.run({"start"}, RunOptions{{{"/tmp/corvane.node", "16k"}}}));
+    expect_files(box, {{CONF, GONE}, {A2_LIST, list}, {LINKS, GONE}});
+    EXPECT_EQ(box.apache_calls(), Words{});
+    expect_logged(box, {"start: cannot take the run lock /tmp/corvane.node: Device or resource busy; nothing was changed"});
+}
+
 // Every file of the root but those the tool writes: its type, size and time.
 std::map<std::string, std::string> outside_tool_files(const Appliance &box) {
     namespace fs = std::filesystem;
