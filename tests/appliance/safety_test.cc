@@ -81,6 +81,7 @@ TEST(Safety, ItemsOutsideTheVolumeFoldersAndLinksOnAUsbVolumeAreNotFollowed) {
     EXPECT_EQ(box.read(CONF).find("Root"), std::string::npos);
     expect_quiet(box.run({"chg", A2 + "/Public", "/"}));
     EXPECT_NE(box.read(CONF).find(section("Public", "On", OPEN)), std::string::npos);
+    expect_files(box, {{LINKS + "/Public", "-> " + A2 + "/Public"}});
 }
 
 // Emptying a link planted as the link directory would empty its target, and
