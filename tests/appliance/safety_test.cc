@@ -2,6 +2,7 @@
 // planted where it writes, follow a link out of a USB volume, publish what
 // lies outside the volume folders, replace a list it could not read, store
 // or place what it did not finish, or lose an edit to another run.
+#include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <map>
@@ -55,6 +56,10 @@ TEST(Safety, NothingPlantedInTmpIsUsed) {
         if (std::string(kind) == "folder") continue;  // what cannot be removed stays; runs go on without it
         expect_files(box, {{"/tmp/corvane.node", GONE}, {"/tmp/corvane_start_lock", GONE}});
         EXPECT_NE(box.read(QUERY).find("<shared_name>Public<"), std::string::npos);
+        Words lines = box.log_lines();
+        EXPECT_TRUE(std::any_of(lines.begin(), lines.end(), [](const std::string &line) {
+            return line.find("start: cleared what another user planted at /tmp/corvane.node") != std::string::npos;
+        })) << testing::PrintToString(lines);
     }
 }
 
